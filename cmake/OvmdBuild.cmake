@@ -1,0 +1,31 @@
+# What every target of the tree is compiled with.
+
+add_library(ovmd_build_flags INTERFACE)
+target_compile_options(ovmd_build_flags INTERFACE -Wall -Wextra -Wpedantic -Wconversion -Wshadow)
+if(OVMD_WERROR)
+  target_compile_options(ovmd_build_flags INTERFACE -Werror)
+endif()
+if(OVMD_SANITIZE)
+  # The sanitizers' own runtime checks stop a test; a report that scrolls by is not a failure.
+  target_compile_options(ovmd_build_flags INTERFACE -fsanitize=${OVMD_SANITIZE}
+    -fno-sanitize-recover=all -fno-omit-frame-pointer)
+  target_link_options(ovmd_build_flags INTERFACE -fsanitize=${OVMD_SANITIZE})
+endif()
+
+# Adds a library of the reference host: ovmd_host_library(<target> <source>...).
+function(ovmd_host_library target)
+  add_library(${target} STATIC ${ARGN})
+  set_target_properties(${target} PROPERTIES POSITION_INDEPENDENT_CODE ON)
+  target_include_directories(${target} PUBLIC ${PROJECT_SOURCE_DIR} ${PROJECT_SOURCE_DIR}/include)
+  target_link_libraries(${target} PRIVATE ovmd_build_flags)
+endfunction()
+
+# Adds a GoogleTest program whose tests CTest runs one by one:
+# ovmd_test(<target> SOURCES <source>... LIBS <library>...).
+function(ovmd_test target)
+  cmake_parse_arguments(arg "" "" "SOURCES;LIBS" ${ARGN})
+  add_executable(${target} ${arg_SOURCES})
+  target_include_directories(${target} PRIVATE ${PROJECT_SOURCE_DIR} ${PROJECT_SOURCE_DIR}/include)
+  target_link_libraries(${target} PRIVATE ovmd_build_flags ${arg_LIBS} GTest::gmock_main)
+  gtest_discover_tests(${target} DISCOVERY_MODE PRE_TEST PROPERTIES TIMEOUT 300)
+endfunction()

@@ -1,0 +1,73 @@
+#pragma once
+// What is inside the host objects that framework/ hands to the library as opaque pointers.
+//
+// Only the framework's own sources and the commit engine look in here; everything else goes
+// through the operations.
+
+#include "framework/bnode.h"
+#include "framework/md_commit.h"
+#include "framework/mdb_db.h"
+#include "framework/tstr_array.h"
+#include "framework/tstring.h"
+#include "framework/typed_arrays.h"
+#include "host/tree/tree.h"
+
+#include <map>
+#include <memory>
+#include <string>
+#include <vector>
+
+struct tstring {
+    std::string text;
+};
+
+struct tstr_array {
+    // A null entry never occurs; every access goes through a valid element.
+    std::vector<std::string> elements;
+};
+
+struct uint32_array {
+    array_options options;
+    std::vector<uint32> elements;
+};
+
+struct bn_attrib_array {
+    std::map<uint32, ovhost::Value> attribs;
+};
+
+struct bn_binding {
+    std::string name;
+    bn_attrib_array attribs;
+};
+
+struct bn_request {
+    std::string event_name;
+    std::vector<bn_binding> bindings;
+};
+
+/// A peer daemon's session: the control socket's side implements it.
+struct gcl_session {
+    virtual ~gcl_session() = default;
+    /// Queues the message without waiting; false when the peer has gone.
+    virtual bool send(const bn_request &request) = 0;
+};
+
+/// A database handle: a snapshot, and whether this handle may be written at this moment.
+struct mdb_db {
+    ovhost::Tree tree;
+    bool writable = false;
+    /// Writes that were tried while the handle was not writable; the commit engine tells the module.
+    unsigned refused_writes = 0;
+};
+
+/// A commit in progress: where a check's refusal goes. The commit engine implements it.
+struct md_commit {
+    virtual ~md_commit() = default;
+    /// Records the refusal of the check that is running; 14002 when none is running.
+    virtual int refuse(int code, std::string message) = 0;
+};
+
+struct mdb_db_change_array {
+    // A null entry stands for a change that a module has dropped from the list.
+    std::vector<std::unique_ptr<mdb_db_change, void (*)(mdb_db_change *)>> changes;
+};
