@@ -13,13 +13,7 @@
 OV_C_BEGIN
 
 /* Levels of a log line; a lower number is more urgent. */
-enum {
-    ov_log_error = 3,
-    ov_log_warning = 4,
-    ov_log_notice = 5,
-    ov_log_info = 6,
-    ov_log_debug = 7
-};
+enum { ov_log_error = 3, ov_log_warning = 4, ov_log_notice = 5, ov_log_info = 6, ov_log_debug = 7 };
 
 /* The flag word that goes with every line of lc_log_internal. */
 enum { lc_log_flags_default = 2048 };

@@ -18,7 +18,7 @@ typedef struct md_commit md_commit;
 
 /* Query options. */
 enum {
-    mdqf_sel_class_no_state = 512,   /* leave out state nodes */
+    mdqf_sel_class_no_state = 512,  /* leave out state nodes */
     mdqf_sel_iterate_subtree = 4096 /* walk the subtree that the pattern spans */
 };
 
@@ -34,10 +34,10 @@ enum { mdct_add = 1, mdct_modify = 2, mdct_delete = 3 };
 
 /* One changed node of a commit. The commit owns the record and everything in it. */
 typedef struct mdb_db_change {
-    tstring *mdc_name;          /* full name */
-    tstr_array *mdc_name_parts; /* its components, counted from 0 without the leading slash */
-    int mdc_change_type;        /* mdct_add, mdct_modify or mdct_delete */
-    tbool mdc_no_notify;        /* the change is not announced to other daemons */
+    tstring *mdc_name;                /* full name */
+    tstr_array *mdc_name_parts;       /* its components, counted from 0 without the leading slash */
+    int mdc_change_type;              /* mdct_add, mdct_modify or mdct_delete */
+    tbool mdc_no_notify;              /* the change is not announced to other daemons */
     bn_attrib_array *mdc_old_attribs; /* null for an added node */
     bn_attrib_array *mdc_new_attribs; /* null for a deleted node */
 } mdb_db_change;

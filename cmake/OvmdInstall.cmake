@@ -1,0 +1,22 @@
+# What `cmake --install` puts in place: the library, its headers with the framework's, a CMake
+# package (find_package(ovmd), target ovmd::ovmd) and a pkg-config file (ovmd).
+
+include(CMakePackageConfigHelpers)
+
+set(package_dir ${CMAKE_INSTALL_LIBDIR}/cmake/ovmd)
+set(package_build_dir ${CMAKE_CURRENT_BINARY_DIR}/package)
+
+install(TARGETS ovmd EXPORT ovmd-targets LIBRARY DESTINATION ${CMAKE_INSTALL_LIBDIR})
+install(DIRECTORY ${PROJECT_SOURCE_DIR}/include/orvale ${PROJECT_SOURCE_DIR}/framework
+  DESTINATION ${CMAKE_INSTALL_INCLUDEDIR}/ovmd FILES_MATCHING PATTERN "*.h")
+install(EXPORT ovmd-targets NAMESPACE ovmd:: DESTINATION ${package_dir})
+
+configure_package_config_file(${PROJECT_SOURCE_DIR}/cmake/ovmd-config.cmake.in
+  ${package_build_dir}/ovmd-config.cmake INSTALL_DESTINATION ${package_dir})
+write_basic_package_version_file(${package_build_dir}/ovmd-config-version.cmake
+  COMPATIBILITY SameMajorVersion)
+install(FILES ${package_build_dir}/ovmd-config.cmake ${package_build_dir}/ovmd-config-version.cmake
+  DESTINATION ${package_dir})
+
+configure_file(${PROJECT_SOURCE_DIR}/cmake/ovmd.pc.in ${package_build_dir}/ovmd.pc @ONLY)
+install(FILES ${package_build_dir}/ovmd.pc DESTINATION ${CMAKE_INSTALL_LIBDIR}/pkgconfig)
