@@ -4,9 +4,9 @@
 #include "framework/files.h"
 #include "libovmd/frame/owners.h"
 #include "libovmd/md_db_default/entry_array.h"
-#include "libovmd/md_db_default/line.h"
 #include "libovmd/md_db_default/type_memo.h"
 #include "libovmd/md_db_default/unit.h"
+#include "orvale/ov_defdb_line.h"
 
 #include <cstring>
 
@@ -20,7 +20,7 @@ struct line_counts {
     uint32 removals = 0;
 };
 
-char *copy_field(const field &source)
+char *copy_field(const ov_defdb_field &source)
 {
     auto *const text = static_cast<char *>(malloc(source.length + 1));
     if (text != nullptr) {
@@ -30,8 +30,9 @@ char *copy_field(const field &source)
     return text;
 }
 
-// The code of a type name; `unknown_line` is a log format for a name that has none, or null.
-int look_up_type(type_memo &memo, const field &name, bn_type &ret_type, owned_text &ret_name)
+// The code of a type name. `ret_name` receives the name as text when the host was asked for it.
+int look_up_type(type_memo &memo, const ov_defdb_field &name, bn_type &ret_type,
+                 owned_text &ret_name)
 {
     if (memo.find(name, ret_type)) {
         return 0;
@@ -48,7 +49,8 @@ int look_up_type(type_memo &memo, const field &name, bn_type &ret_type, owned_te
 }
 
 // Fills an entry; `value` null means that the entry has none. On failure nothing stays allocated.
-int make_entry(const field &name, bn_type type, const field *value, bn_str_value &ret_entry)
+int make_entry(const ov_defdb_field &name, bn_type type, const ov_defdb_field *value,
+               bn_str_value &ret_entry)
 {
     bn_str_value entry = {copy_field(name), type, value != nullptr ? copy_field(*value) : nullptr};
     if (entry.bv_name == nullptr || (value != nullptr && entry.bv_value == nullptr)) {
@@ -61,15 +63,17 @@ int make_entry(const field &name, bn_type type, const field *value, bn_str_value
 
 int convert_line_to_bn_str_value(const char *line, type_memo &memo, bn_str_value &ret_entry)
 {
-    const line_fields fields = split_line(line);
-    if (fields.name.empty() || fields.type.empty()) {
+    const ov_defdb_fields fields = ov_defdb_split(line);
+    if (fields.name.length == 0 || fields.type.length == 0) {
         return lc_err_parse_error;
     }
     bn_type type = 0;
     owned_text type_name;
     const int err = look_up_type(memo, fields.type, type, type_name);
     if (err != 0) {
-        BAIL_LOG("Unable to convert %s type", type_name.get());
+        if (type_name.get() != nullptr) {
+            BAIL_LOG("Unable to convert %s type", type_name.get());
+        }
         return err;
     }
     return make_entry(fields.name, type, &fields.value, ret_entry);
@@ -78,11 +82,11 @@ int convert_line_to_bn_str_value(const char *line, type_memo &memo, bn_str_value
 // A removal needs its name alone. Without a type a value says nothing and is dropped.
 int convert_removal(const char *line, type_memo &memo, bn_str_value &ret_entry)
 {
-    const line_fields fields = split_line(line);
-    if (fields.name.empty()) {
+    const ov_defdb_fields fields = ov_defdb_split(line);
+    if (fields.name.length == 0) {
         return lc_err_parse_error;
     }
-    if (fields.type.empty()) {
+    if (fields.type.length == 0) {
         return make_entry(fields.name, 0, nullptr, ret_entry);
     }
     bn_type type = 0;
@@ -91,16 +95,18 @@ int convert_removal(const char *line, type_memo &memo, bn_str_value &ret_entry)
     if (err != 0) {
         return err;
     }
-    return make_entry(fields.name, type, fields.value.empty() ? nullptr : &fields.value, ret_entry);
+    return make_entry(fields.name, type, fields.value.length == 0 ? nullptr : &fields.value,
+                      ret_entry);
 }
 
 line_counts count_lines(const tstr_array *lines, uint32 num_lines)
 {
     line_counts counts;
     for (uint32 i = 0; i < num_lines; ++i) {
-        const line_kind kind = kind_of_line(line_start(tstr_array_get_str_quick(lines, i)));
-        counts.values += kind == line_kind::value;
-        counts.removals += kind == line_kind::removal;
+        const ov_defdb_line_kind kind =
+            ov_defdb_kind(ov_defdb_line_start(tstr_array_get_str_quick(lines, i)));
+        counts.values += kind == ov_defdb_value;
+        counts.removals += kind == ov_defdb_removal;
     }
     return counts;
 }
@@ -133,19 +139,19 @@ int db_default_get_file_default(const char *path, bn_str_value **ret_values, uin
     int result = 0;
     type_memo memo;
     for (uint32 i = 0; i < num_lines; ++i) {
-        const char *const start = line_start(tstr_array_get_str_quick(lines.get(), i));
-        const line_kind kind = kind_of_line(start);
-        if (kind == line_kind::comment) {
+        const char *const start = ov_defdb_line_start(tstr_array_get_str_quick(lines.get(), i));
+        const ov_defdb_line_kind kind = ov_defdb_kind(start);
+        if (kind == ov_defdb_comment) {
             continue;
         }
         bn_str_value entry = {};
-        result = kind == line_kind::value ? convert_line_to_bn_str_value(start, memo, entry)
-                                          : convert_removal(start + 1, memo, entry);
+        result = kind == ov_defdb_value ? convert_line_to_bn_str_value(start, memo, entry)
+                                        : convert_removal(start + 1, memo, entry);
         if (result != 0) {
             (void)BAIL_REPORT(result);
             continue;
         }
-        (kind == line_kind::value ? values : removals).append(entry);
+        (kind == ov_defdb_value ? values : removals).append(entry);
     }
     values.hand_over(ret_values, ret_num_values);
     removals.hand_over(ret_deletes, ret_num_deletes);

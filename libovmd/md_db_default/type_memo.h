@@ -6,7 +6,7 @@
 #pragma once
 
 #include "framework/bnode.h"
-#include "libovmd/md_db_default/line.h"
+#include "orvale/ov_defdb_line.h"
 
 #include <cstring>
 
@@ -17,7 +17,7 @@ class type_memo
 {
   public:
     // `name` is not empty. Answers false when the name must be asked of the host.
-    bool find(const field &name, bn_type &ret_type) const
+    bool find(const ov_defdb_field &name, bn_type &ret_type) const
     {
         const slot &known = slots_[slot_of(name)];
         if (known.name.length != name.length ||
@@ -29,18 +29,21 @@ class type_memo
     }
 
     // The name's text must stay as long as the memo; a name that shares its slot is forgotten.
-    void remember(const field &name, bn_type type) { slots_[slot_of(name)] = {name, type}; }
+    void remember(const ov_defdb_field &name, bn_type type)
+    {
+        slots_[slot_of(name)] = {name, type};
+    }
 
   private:
     struct slot {
-        field name;
+        ov_defdb_field name = {nullptr, 0};
         bn_type type = 0;
     };
 
     static constexpr size_t num_slots = 64;
 
     // Length and both ends tell most type names apart.
-    static size_t slot_of(const field &name)
+    static size_t slot_of(const ov_defdb_field &name)
     {
         const auto first = static_cast<unsigned char>(name.text[0]);
         const auto last = static_cast<unsigned char>(name.text[name.length - 1]);
