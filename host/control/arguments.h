@@ -1,0 +1,19 @@
+#pragma once
+// Reads the arguments of a request, for those who handle one (RequestHandler in server.h). A
+// missing or wrongly typed argument is a RequestError "bad-request" that names command and
+// argument.
+
+#include <nlohmann/json_fwd.hpp>
+
+#include <string>
+
+namespace ovhost
+{
+
+[[nodiscard]] std::string required_text(const nlohmann::json &request, const char *name);
+[[nodiscard]] std::string optional_text(const nlohmann::json &request, const char *name,
+                                        const std::string &otherwise = {});
+[[nodiscard]] bool optional_flag(const nlohmann::json &request, const char *name,
+                                 bool otherwise = false);
+
+} // namespace ovhost

@@ -1,0 +1,229 @@
+#include "host/control/connection.h"
+
+#include "host/control/message.h"
+
+#include <event2/event.h>
+#include <nlohmann/json.hpp>
+#include <sys/socket.h>
+
+#include <array>
+#include <cerrno>
+#include <cstring>
+#include <stdexcept>
+
+namespace ovhost
+{
+
+namespace
+{
+
+timeval to_timeval(std::chrono::milliseconds span)
+{
+    return {.tv_sec = static_cast<time_t>(span.count() / 1000),
+            .tv_usec = static_cast<suseconds_t>(span.count() % 1000 * 1000)};
+}
+
+ClientInfo credentials_of(int fd, std::uint64_t number)
+{
+    ucred credentials{};
+    socklen_t size = sizeof(credentials);
+    if (::getsockopt(fd, SOL_SOCKET, SO_PEERCRED, &credentials, &size) != 0)
+        throw std::runtime_error(std::string("cannot tell who connected: ") + std::strerror(errno));
+    return {.number = number, .pid = credentials.pid, .uid = credentials.uid, .peer = {}};
+}
+
+EventPtr new_event(EventLoop &loop, int fd, short what, event_callback_fn callback, void *context)
+{
+    EventPtr result(event_new(loop.base(), fd, what, callback, context));
+    if (!result)
+        throw std::runtime_error("cannot add a client to the event loop");
+    return result;
+}
+
+} // namespace
+
+Connection::Connection(EventLoop &loop, UniqueFd fd, std::uint64_t number,
+                       const ServerLimits &limits, Owner &owner)
+    : fd_(std::move(fd)), client_(credentials_of(fd_.get(), number)), limits_(limits),
+      owner_(owner),
+      read_event_(new_event(loop, fd_.get(), EV_READ | EV_PERSIST, on_readable, this)),
+      write_event_(new_event(loop, fd_.get(), EV_WRITE, on_writable, this)),
+      input_(limits.max_request)
+{
+    resume_reading();
+}
+
+void Connection::on_readable(int, short, void *connection)
+{
+    static_cast<Connection *>(connection)->guarded(&Connection::read_input);
+}
+
+void Connection::on_writable(int, short what, void *connection)
+{
+    static_cast<Connection *>(connection)
+        ->guarded((what & EV_TIMEOUT) != 0 ? &Connection::check_stall : &Connection::write_output);
+}
+
+/// The event loop is C code: an exception ends the connection it came from, not the daemon.
+void Connection::guarded(void (Connection::*step)())
+{
+    try {
+        (this->*step)();
+    } catch (const std::exception &fault) {
+        end(fault.what());
+    }
+}
+
+void Connection::read_input()
+{
+    std::array<char, 65536> piece;
+    const ssize_t got = ::recv(fd_.get(), piece.data(), piece.size(), MSG_DONTWAIT);
+    if (got < 0) {
+        if (errno != EAGAIN && errno != EINTR)
+            end(errno == ECONNRESET ? std::string() : std::strerror(errno));
+        return;
+    }
+    if (got == 0)
+        end_of_input_ = true;
+    else
+        input_.feed({piece.data(), static_cast<std::size_t>(got)});
+    serve();
+}
+
+void Connection::write_output()
+{
+    flush();
+    if (!over_)
+        serve();
+}
+
+void Connection::check_stall()
+{
+    if (progress_)
+        await_writable();
+    else
+        end("does not read: " + std::to_string(waiting()) + " bytes waited for " +
+            std::to_string(limits_.stall_timeout.count()) + " ms");
+}
+
+/// Answers what has come in, as long as the client reads its answers.
+void Connection::serve()
+{
+    // A handler that sends an event to its own client must not start a second round.
+    if (serving_ || finishing_)
+        return;
+    serving_ = true;
+    while (!over_ && !finishing_ && waiting() < limits_.max_waiting) {
+        const auto line = input_.next();
+        if (!line) {
+            serve_end_of_input();
+            break;
+        }
+        if (line->find_first_not_of(" \t\r") != std::string_view::npos)
+            send(owner_.answer(*this, *line));
+    }
+    serving_ = false;
+    if (over_ || finishing_)
+        return;
+    if (end_of_input_ || waiting() >= limits_.max_waiting)
+        pause_reading();
+    else
+        resume_reading();
+}
+
+/// Every whole line is answered: what is left to do when no more can come.
+void Connection::serve_end_of_input()
+{
+    if (input_.too_long()) {
+        const RequestError error(error_code::too_long, "the request is longer than " +
+                                                           std::to_string(limits_.max_request) +
+                                                           " bytes: send it in smaller parts");
+        finish_with(error_line(nullptr, error));
+        return;
+    }
+    if (!end_of_input_)
+        return;
+    const std::string last(input_.rest());
+    finish_with(last.find_first_not_of(" \t\r") == std::string::npos ? std::string()
+                                                                     : owner_.answer(*this, last));
+}
+
+void Connection::send(std::string_view line)
+{
+    if (over_)
+        return;
+    output_.append(line);
+    flush();
+}
+
+bool Connection::send_event(std::string_view line)
+{
+    if (over_ || finishing_)
+        return false;
+    if (waiting() > 0)
+        flush();
+    if (!over_ && waiting() > 0 && waiting() + line.size() > limits_.max_waiting)
+        end("does not read: " + std::to_string(waiting()) + " bytes wait for it, " +
+            std::to_string(limits_.max_waiting) + " may");
+    send(line);
+    return !over_;
+}
+
+void Connection::finish_with(std::string_view line)
+{
+    if (over_)
+        return;
+    finishing_ = true;
+    pause_reading();
+    send(line);
+}
+
+void Connection::flush()
+{
+    const std::size_t before = waiting();
+    if (!output_.write_to(fd_.get())) {
+        // The reader has gone: for a client that is an ordinary end.
+        end({});
+        return;
+    }
+    progress_ = progress_ || waiting() < before;
+    if (waiting() > 0)
+        await_writable();
+    else if (finishing_)
+        end({});
+}
+
+/// A wait that is already under way goes on: sending more to one that does not read must not put
+/// off the end of its patience.
+void Connection::await_writable()
+{
+    if (event_pending(write_event_.get(), EV_WRITE, nullptr) != 0)
+        return;
+    progress_ = false;
+    const timeval patience = to_timeval(limits_.stall_timeout);
+    event_add(write_event_.get(), &patience);
+}
+
+void Connection::pause_reading()
+{
+    event_del(read_event_.get());
+}
+
+void Connection::resume_reading()
+{
+    if (event_pending(read_event_.get(), EV_READ, nullptr) == 0)
+        event_add(read_event_.get(), nullptr);
+}
+
+void Connection::end(const std::string &fault)
+{
+    if (over_)
+        return;
+    over_ = true;
+    event_del(read_event_.get());
+    event_del(write_event_.get());
+    ::shutdown(fd_.get(), SHUT_RDWR);
+    owner_.ended(*this, fault);
+}
+
+} // namespace ovhost

@@ -1,0 +1,94 @@
+#pragma once
+// One client of the control socket: takes its requests in order, one at a time, and keeps what it
+// has not read yet. server.h owns the connections and answers the requests.
+
+#include "host/control/event_loop.h"
+#include "host/control/framing.h"
+#include "host/control/output_queue.h"
+#include "host/control/request_handler.h"
+#include "host/control/unique_fd.h"
+
+#include <chrono>
+#include <cstddef>
+#include <string>
+#include <string_view>
+
+namespace ovhost
+{
+
+struct ServerLimits {
+    /// Longest request line, in bytes.
+    std::size_t max_request = 16UL << 20;
+    /// How many bytes may wait for one client. A client over it is served no further requests until
+    /// it has read some answers; a peer is disconnected when an event would take it over.
+    std::size_t max_waiting = 8UL << 20;
+    std::size_t max_clients = 512;
+    /// A client that has not taken one waiting byte for so long is disconnected.
+    std::chrono::milliseconds stall_timeout{30000};
+};
+
+class Connection
+{
+  public:
+    class Owner
+    {
+      public:
+        virtual ~Owner() = default;
+        /// The answer line to a request line.
+        [[nodiscard]] virtual std::string answer(Connection &from, std::string_view line) = 0;
+        /// Called once, when the connection is over; `fault` is empty for an ordinary end. The
+        /// connection must outlive the call.
+        virtual void ended(Connection &connection, const std::string &fault) = 0;
+    };
+
+    Connection(EventLoop &loop, UniqueFd fd, std::uint64_t number, const ServerLimits &limits,
+               Owner &owner);
+    Connection(const Connection &) = delete;
+    Connection &operator=(const Connection &) = delete;
+
+    /// Sends a line nobody asked for. False when the client has too much waiting or is gone; the
+    /// connection is then over.
+    bool send_event(std::string_view line);
+
+    /// Sends a last line and ends the connection once it is written. Requests that have not been
+    /// answered yet are not.
+    void finish_with(std::string_view line);
+
+    [[nodiscard]] const ClientInfo &client() const { return client_; }
+    void set_peer(const std::string &name) { client_.peer = name; }
+
+    [[nodiscard]] std::size_t waiting() const { return output_.size(); }
+
+  private:
+    static void on_readable(int fd, short what, void *connection);
+    static void on_writable(int fd, short what, void *connection);
+
+    void guarded(void (Connection::*step)());
+    void read_input();
+    void write_output();
+    void check_stall();
+    void serve();
+    void serve_end_of_input();
+    void send(std::string_view line);
+    void flush();
+    void await_writable();
+    void pause_reading();
+    void resume_reading();
+    void end(const std::string &fault);
+
+    UniqueFd fd_;
+    ClientInfo client_;
+    const ServerLimits &limits_;
+    Owner &owner_;
+    EventPtr read_event_;
+    EventPtr write_event_;
+    LineSplitter input_;
+    OutputQueue output_;
+    bool end_of_input_ = false;
+    bool finishing_ = false;
+    bool serving_ = false;
+    bool over_ = false;
+    bool progress_ = false;
+};
+
+} // namespace ovhost

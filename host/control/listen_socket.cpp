@@ -1,0 +1,138 @@
+#include "host/control/listen_socket.h"
+
+#include "host/control/socket_address.h"
+
+#include <fcntl.h>
+#include <sys/file.h>
+#include <sys/socket.h>
+#include <sys/stat.h>
+
+#include <cerrno>
+#include <chrono>
+#include <cstring>
+#include <filesystem>
+#include <stdexcept>
+#include <thread>
+
+namespace ovhost
+{
+
+namespace
+{
+
+[[noreturn]] void fail(const std::string &path, const std::string &reason)
+{
+    throw std::runtime_error("cannot create socket " + path + ": " + reason);
+}
+
+[[noreturn]] void fail_with_errno(const std::string &path, const std::string &what = {})
+{
+    const std::string reason = std::strerror(errno);
+    fail(path, what + reason);
+}
+
+class ScopedUmask
+{
+  public:
+    explicit ScopedUmask(mode_t mask) : before_(::umask(mask)) {}
+    ~ScopedUmask() { ::umask(before_); }
+    ScopedUmask(const ScopedUmask &) = delete;
+    ScopedUmask &operator=(const ScopedUmask &) = delete;
+
+  private:
+    mode_t before_;
+};
+
+/// Two daemons that start at once must not each take the other's fresh socket for a stale one: who
+/// holds the lock on the directory looks, removes and binds undisturbed.
+UniqueFd lock_directory_of(const std::string &path)
+{
+    std::string directory = std::filesystem::path(path).parent_path().string();
+    if (directory.empty())
+        directory = ".";
+    UniqueFd fd(::open(directory.c_str(), O_RDONLY | O_DIRECTORY | O_CLOEXEC));
+    if (!fd)
+        fail_with_errno(path, "directory " + directory + ": ");
+
+    constexpr int tries = 40;
+    constexpr std::chrono::milliseconds pause(50);
+    for (int i = 0; i < tries; ++i) {
+        if (::flock(fd.get(), LOCK_EX | LOCK_NB) == 0)
+            return fd;
+        if (errno != EWOULDBLOCK && errno != EINTR)
+            fail_with_errno(path, "locking directory " + directory + ": ");
+        std::this_thread::sleep_for(pause);
+    }
+    fail(path, "another process keeps directory " + directory +
+                   " locked: stop it or choose another --socket");
+}
+
+/// Whether a daemon listens behind an existing socket file.
+bool is_live(const std::string &path)
+{
+    const sockaddr_un address = socket_address(path);
+    const UniqueFd probe = new_socket();
+    if (::connect(probe.get(), reinterpret_cast<const sockaddr *>(&address), sizeof(address)) == 0)
+        return true;
+    if (errno == ECONNREFUSED || errno == ENOENT)
+        return false;
+    // Its queue of new connections is full: there is a listener, if a slow one.
+    if (errno == EAGAIN)
+        return true;
+    fail_with_errno(path, "the socket that stands there cannot be tried: ");
+}
+
+void remove_stale(const std::string &path)
+{
+    struct stat status {
+    };
+    if (::lstat(path.c_str(), &status) != 0) {
+        if (errno == ENOENT)
+            return;
+        fail_with_errno(path);
+    }
+    if (!S_ISSOCK(status.st_mode))
+        fail(path, "something else than a socket stands there: remove it or choose another "
+                   "--socket");
+    if (is_live(path))
+        throw std::runtime_error("socket in use by another mgmtd (" + path +
+                                 "): stop it or choose another --socket");
+    if (::unlink(path.c_str()) != 0 && errno != ENOENT)
+        fail_with_errno(path, "removing the stale socket: ");
+}
+
+void bind_private(int fd, const std::string &path)
+{
+    const sockaddr_un address = socket_address(path);
+    const ScopedUmask only_owner(0177);
+    if (::bind(fd, reinterpret_cast<const sockaddr *>(&address), sizeof(address)) != 0)
+        fail_with_errno(path);
+}
+
+} // namespace
+
+ListenSocket::ListenSocket(std::string path) : path_(std::move(path))
+{
+    // Tells of a path that is too long before anything is touched.
+    static_cast<void>(socket_address(path_));
+    const UniqueFd lock = lock_directory_of(path_);
+    remove_stale(path_);
+    fd_ = new_socket();
+    bind_private(fd_.get(), path_);
+    struct stat status {
+    };
+    if (::lstat(path_.c_str(), &status) != 0 || ::listen(fd_.get(), SOMAXCONN) != 0)
+        fail_with_errno(path_);
+    device_ = status.st_dev;
+    inode_ = status.st_ino;
+}
+
+ListenSocket::~ListenSocket()
+{
+    struct stat status {
+    };
+    if (::lstat(path_.c_str(), &status) == 0 && status.st_dev == device_ && status.st_ino == inode_)
+        ::unlink(path_.c_str());
+}
+
+} // namespace ovhost

@@ -1,0 +1,14 @@
+#include "host/control/request_error.h"
+
+#include <utility>
+
+namespace ovhost
+{
+
+RequestError::RequestError(std::string code, const std::string &message,
+                           std::vector<ErrorDetail> details)
+    : std::runtime_error(message), code_(std::move(code)), details_(std::move(details))
+{
+}
+
+} // namespace ovhost

@@ -1,0 +1,35 @@
+#pragma once
+// Owner of one file descriptor.
+
+#include <unistd.h>
+
+#include <utility>
+
+namespace ovhost
+{
+
+class UniqueFd
+{
+  public:
+    UniqueFd() = default;
+    explicit UniqueFd(int fd) : fd_(fd) {}
+    UniqueFd(UniqueFd &&other) noexcept : fd_(std::exchange(other.fd_, -1)) {}
+    UniqueFd &operator=(UniqueFd &&other) noexcept
+    {
+        std::swap(fd_, other.fd_);
+        return *this;
+    }
+    ~UniqueFd()
+    {
+        if (fd_ >= 0)
+            ::close(fd_);
+    }
+
+    [[nodiscard]] int get() const { return fd_; }
+    [[nodiscard]] explicit operator bool() const { return fd_ >= 0; }
+
+  private:
+    int fd_ = -1;
+};
+
+} // namespace ovhost
