@@ -24,6 +24,8 @@ struct tstring {
 struct tstr_array {
     // A null entry never occurs; every access goes through a valid element.
     std::vector<std::string> elements;
+    // Of the options only the duplicate policy is looked at; zero is adp_add.
+    array_options options = {};
 };
 
 struct uint32_array {
@@ -56,7 +58,8 @@ struct gcl_session {
 struct mdb_db {
     ovhost::Tree tree;
     bool writable = false;
-    /// Writes that were tried while the handle was not writable; the commit engine tells the module.
+    /// Writes that were tried while the handle was not writable; the commit engine tells the
+    /// module.
     unsigned refused_writes = 0;
 };
 

@@ -1,0 +1,46 @@
+#include "framework/md_commit.h"
+
+#include "host/framework/c_boundary.h"
+#include "host/framework/format.h"
+#include "host/framework/objects.h"
+#include "host/framework/sessions.h"
+
+#include <cstdarg>
+
+using ovhost::at_c_boundary;
+
+int md_commit_set_return_status_msg(md_commit *commit, int code, const char *text)
+{
+    if (commit == nullptr || text == nullptr) {
+        return lc_err_unexpected_null;
+    }
+    return at_c_boundary([&] { return commit->refuse(code, text); });
+}
+
+int md_commit_set_return_status_msg_fmt(md_commit *commit, int code, const char *format, ...)
+{
+    if (commit == nullptr || format == nullptr) {
+        return lc_err_unexpected_null;
+    }
+    va_list arguments;
+    va_start(arguments, format);
+    const int status =
+        at_c_boundary([&] { return commit->refuse(code, ovhost::format_text(format, arguments)); });
+    va_end(arguments);
+    return status;
+}
+
+int md_gcl_find_session(const char *peer_name, gcl_session **ret)
+{
+    if (ret == nullptr) {
+        return lc_err_unexpected_null;
+    }
+    *ret = nullptr;
+    if (peer_name == nullptr) {
+        return lc_err_unexpected_null;
+    }
+    return at_c_boundary([&]() -> int {
+        *ret = ovhost::find_session(peer_name);
+        return lc_err_no_error;
+    });
+}
