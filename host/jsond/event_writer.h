@@ -1,0 +1,37 @@
+#pragma once
+// Writes events to a file, a pipe or a terminal, one JSON line each. peer.h is where they come
+// from.
+
+#include "host/control/unique_fd.h"
+
+#include <nlohmann/json_fwd.hpp>
+
+#include <string>
+#include <string_view>
+
+namespace ovhost
+{
+
+class EventWriter
+{
+  public:
+    /// Appends to the file `path`, created when it is not there; standard output when `path` is
+    /// empty. A wait for a slow reader ends when `stop_fd` becomes readable. Throws
+    /// std::runtime_error that names the file.
+    EventWriter(const std::string &path, int stop_fd);
+
+    /// Writes one line; when it returns true the system has all of it. False when told to stop.
+    /// Throws std::runtime_error that names the file.
+    [[nodiscard]] bool write(const nlohmann::json &event);
+
+  private:
+    [[nodiscard]] bool wait_for_reader() const;
+    [[noreturn]] void fail() const;
+
+    std::string name_;
+    UniqueFd file_;
+    int fd_;
+    int stop_fd_;
+};
+
+} // namespace ovhost

@@ -1,0 +1,60 @@
+// jsond: writes each event of mgmtd as one JSON line. This file reads the command line; peer.h does
+// the work.
+
+#include "host/jsond/peer.h"
+#include "host/jsond/signal_pipe.h"
+
+#include <CLI/CLI.hpp>
+
+#include <csignal>
+#include <iostream>
+
+namespace
+{
+
+constexpr int exit_usage = 2;
+
+constexpr const char *footer = "Exit codes: 0 ended by SIGTERM or SIGINT, 1 mgmtd or the output "
+                               "failed, 2 usage.\n\n"
+                               "Example:\n"
+                               "  jsond --retry --output /var/log/mgmtd-events.jsonl";
+
+void report(const std::string &message)
+{
+    std::cerr << "jsond: " << message << std::endl;
+}
+
+int work(const ovhost::JsondOptions &options)
+try {
+    using std::chrono::milliseconds;
+    std::signal(SIGPIPE, SIG_IGN);
+    const ovhost::SignalPipe stop;
+    ovhost::EventWriter writer(options.output, stop.fd());
+    ovhost::JsondPeer peer(options, stop.fd(), writer,
+                           ovhost::Backoff(milliseconds(100), milliseconds(5000)), report);
+    return peer.run();
+} catch (const std::exception &error) {
+    report(error.what());
+    return 1;
+}
+
+} // namespace
+
+int main(int argc, char **argv)
+{
+    ovhost::JsondOptions options{.socket = "/run/mgmtd/control.sock", .output = {}, .retry = false};
+    CLI::App app("Registers with mgmtd as the peer \"jsond\" and writes each event as a JSON line.",
+                 "jsond");
+    app.footer(footer);
+    app.add_option("--socket", options.socket, "The control socket of mgmtd")
+        ->capture_default_str();
+    app.add_option("--output", options.output,
+                   "The file events are appended to (standard output when not given)");
+    app.add_flag("--retry", options.retry, "Wait for mgmtd, and come back when it went away");
+    try {
+        app.parse(argc, argv);
+    } catch (const CLI::ParseError &error) {
+        return app.exit(error) == 0 ? 0 : exit_usage;
+    }
+    return work(options);
+}

@@ -1,0 +1,157 @@
+#include "host/ovctl/command_table.h"
+
+#include "host/ovctl/render.h"
+#include "host/ovctl/text_input.h"
+
+#include <nlohmann/json.hpp>
+
+#include <iterator>
+
+namespace ovhost
+{
+
+using nlohmann::json;
+
+namespace
+{
+
+using enum ArgumentSpec::Kind;
+
+constexpr ArgumentSpec get_arguments[] = {
+    {positional, "name", "The node's full name"},
+    {flag, "subtree", "The node and everything below it"},
+    {flag, "candidate", "From the candidate, not from the running configuration"},
+};
+
+constexpr ArgumentSpec set_arguments[] = {
+    {positional, "name", "The node's full name"},
+    {positional, "type", "The type's name, such as uint32, bool, string or ipv4addr"},
+    {positional, "value", "The value as text"},
+};
+
+constexpr ArgumentSpec delete_arguments[] = {
+    {positional, "name", "The node's full name"},
+};
+
+constexpr ArgumentSpec load_arguments[] = {
+    {positional, "file",
+     "A file of lines NAME,TYPE,VALUE to set, -NAME to remove, and # comments; - is standard "
+     "input"},
+};
+
+constexpr ArgumentSpec commit_arguments[] = {
+    {text, "comment", "A remark kept with the commit"},
+};
+
+json no_arguments(const Arguments &)
+{
+    return json::object();
+}
+
+json get_request(const Arguments &arguments)
+{
+    return {{"name", checked_utf8(arguments.at("name"), "NAME")},
+            {"subtree", arguments.contains("subtree")},
+            {"from", arguments.contains("candidate") ? "candidate" : "running"}};
+}
+
+json set_request(const Arguments &arguments)
+{
+    return {{"name", checked_utf8(arguments.at("name"), "NAME")},
+            {"type", checked_utf8(arguments.at("type"), "TYPE")},
+            {"value", checked_utf8(arguments.at("value"), "VALUE")}};
+}
+
+json delete_request(const Arguments &arguments)
+{
+    return {{"name", checked_utf8(arguments.at("name"), "NAME")}};
+}
+
+json load_request(const Arguments &arguments)
+{
+    const std::string &file = arguments.at("file");
+    return {{"text", read_text(file)}, {"source", file == "-" ? "standard input" : file}};
+}
+
+json commit_request(const Arguments &arguments)
+{
+    const auto comment = arguments.find("comment");
+    if (comment == arguments.end())
+        return json::object();
+    return {{"comment", checked_utf8(comment->second, "the comment")}};
+}
+
+json show_mode_request(const Arguments &)
+{
+    return {{"what", "mode"}};
+}
+
+constexpr Command table[] = {
+    {"get", "Print nodes as lines NAME TYPE VALUE", "ovctl get /ov/tunneld/system/config/mode",
+     get_arguments, "get", get_request, render_nodes, "the query"},
+    {"set", "Set a node in the candidate", "ovctl set /ov/tunneld/system/config/mode string router",
+     set_arguments, "set", set_request, render_nothing, "the change"},
+    {"delete", "Remove a node and everything below it from the candidate",
+     "ovctl delete /ov/tunneld/system/config/mode", delete_arguments, "delete", delete_request,
+     render_nothing, "the change"},
+    {"load", "Apply the lines of a file to the candidate, all or none",
+     "ovctl load site.db && ovctl commit", load_arguments, "load", load_request, render_load,
+     "the file"},
+    {"check",
+     "Try the commit of the candidate without doing it",
+     "ovctl check",
+     {},
+     "check",
+     no_arguments,
+     render_check,
+     "the candidate"},
+    {"commit", "Make the candidate the running configuration",
+     "ovctl commit --comment \"router mode for the new site\"", commit_arguments, "commit",
+     commit_request, render_commit, "the commit"},
+    {"diff",
+     "List what the candidate changes: + added, - removed, ~ modified",
+     "ovctl diff",
+     {},
+     "diff",
+     no_arguments,
+     render_diff,
+     "the query"},
+    {"discard",
+     "Drop the changes of the candidate",
+     "ovctl discard",
+     {},
+     "discard",
+     no_arguments,
+     render_discard,
+     "the change"},
+    {"status",
+     "Print facts about the daemon",
+     "ovctl status",
+     {},
+     "status",
+     no_arguments,
+     render_status,
+     "the query"},
+    {"show mode",
+     "Print the deployment mode and what follows from it",
+     "ovctl show mode",
+     {},
+     "show",
+     show_mode_request,
+     render_mode,
+     "the query"},
+};
+
+} // namespace
+
+std::span<const Command> commands()
+{
+    return table;
+}
+
+const char *group_help(const std::string &group)
+{
+    return group == "show" ? "Print what the running configuration amounts to" : "";
+}
+
+} // namespace ovhost

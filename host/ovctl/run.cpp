@@ -1,0 +1,88 @@
+#include "host/ovctl/run.h"
+
+#include "host/control/client.h"
+#include "host/control/message.h"
+#include "host/ovctl/render_error.h"
+#include "host/ovctl/text_input.h"
+
+#include <nlohmann/json.hpp>
+
+#include <ostream>
+
+namespace ovhost
+{
+
+using nlohmann::json;
+
+namespace
+{
+
+/// What ends a command without an answer of mgmtd: its exit code, and the code --json prints.
+struct Failure {
+    ExitCode exit;
+    const char *code;
+};
+
+Failure failure_of(ClientError::Kind kind)
+{
+    if (kind == ClientError::Kind::protocol)
+        return {ExitCode::protocol, "protocol"};
+    if (kind == ClientError::Kind::timeout)
+        return {ExitCode::unreachable, "timeout"};
+    return {ExitCode::unreachable, "unreachable"};
+}
+
+ExitCode report(const Failure &failure, const std::string &message, const Options &options,
+                std::ostream &out, std::ostream &err)
+{
+    if (options.json)
+        render_error_json(RequestError(failure.code, message), out);
+    else
+        err << "ovctl: " << message << '\n';
+    return failure.exit;
+}
+
+void ask_and_print(const Invocation &invocation, std::ostream &out)
+{
+    const Command &command = *invocation.command;
+    const json arguments = command.build(invocation.arguments);
+    const std::chrono::duration<double> patience(invocation.options.timeout_seconds);
+    ControlClient client(invocation.options.socket,
+                         std::chrono::ceil<std::chrono::milliseconds>(patience));
+    const json result = client.call(command.request, arguments);
+    if (invocation.options.json)
+        out << to_line({{"ok", true}, {"result", result}});
+    else
+        command.render(result, out);
+}
+
+} // namespace
+
+ExitCode run_command(const Invocation &invocation, std::ostream &out, std::ostream &err)
+{
+    const Options &options = invocation.options;
+    const auto fail = [&](const Failure &failure, const std::string &message) {
+        return report(failure, message, options, out, err);
+    };
+    try {
+        ask_and_print(invocation, out);
+        return ExitCode::ok;
+    } catch (const RequestError &refusal) {
+        if (options.json)
+            render_error_json(refusal, out);
+        else
+            render_refusal(refusal, invocation.command->subject, err);
+        return ExitCode::refused;
+    } catch (const ClientError &error) {
+        return fail(failure_of(error.kind()), error.what());
+    } catch (const UsageError &error) {
+        return fail({ExitCode::usage, "usage"}, error.what());
+    } catch (const json::exception &error) {
+        return fail({ExitCode::protocol, "protocol"},
+                    std::string("mgmtd's answer lacks something: ") + error.what());
+    } catch (const std::exception &error) {
+        return fail({ExitCode::usage, "usage"}, error.what());
+    }
+}
+
+} // namespace ovhost
