@@ -1,0 +1,72 @@
+#include "host/store/schema.h"
+
+#include <array>
+
+#include "host/store/sqlite.h"
+
+namespace ovhost
+{
+namespace
+{
+
+// Step n (from 0) brings version n to version n + 1. A step that was shipped is never edited:
+// a change of the tables is a new step at the end.
+constexpr std::array kSteps{
+    R"(CREATE TABLE meta (
+           id INTEGER PRIMARY KEY CHECK (id = 1),
+           commits INTEGER NOT NULL CHECK (commits >= 0)
+       ) STRICT;
+       INSERT INTO meta VALUES (1, 0);
+       CREATE TABLE nodes (
+           name TEXT PRIMARY KEY NOT NULL,
+           type INTEGER NOT NULL CHECK (type BETWEEN 0 AND 4294967295),
+           text TEXT NOT NULL
+       ) WITHOUT ROWID, STRICT;)",
+};
+
+void run_steps(const Connection &db, std::int64_t from, std::int64_t to)
+{
+    for (std::int64_t version = from; version < to; ++version) {
+        db.execute(kSteps[static_cast<std::size_t>(version)]);
+    }
+}
+
+} // namespace
+
+std::int64_t schema_version() noexcept
+{
+    return static_cast<std::int64_t>(kSteps.size());
+}
+
+void upgrade_schema(const Connection &db)
+{
+    const std::int64_t version = db.integer("PRAGMA user_version");
+    if (version == schema_version())
+        return;
+    db.execute("BEGIN IMMEDIATE");
+    run_steps(db, version, schema_version());
+    db.execute("PRAGMA application_id = " + std::to_string(kApplicationId));
+    db.execute("PRAGMA user_version = " + std::to_string(schema_version()));
+    db.execute("COMMIT");
+}
+
+std::vector<std::string> schema_of(const Connection &db)
+{
+    // SQLite's own entries, such as ANALYZE's statistics, do no harm.
+    Statement query =
+        db.prepare("SELECT type || ' ' || name || ': ' || coalesce(sql, '') FROM sqlite_schema"
+                   " WHERE name NOT LIKE 'sqlite\\_%' ESCAPE '\\' ORDER BY name");
+    std::vector<std::string> entries;
+    while (query.step())
+        entries.push_back(query.text(0));
+    return entries;
+}
+
+std::vector<std::string> expected_schema(std::int64_t version)
+{
+    const Connection db = Connection::in_memory();
+    run_steps(db, 0, version);
+    return schema_of(db);
+}
+
+} // namespace ovhost

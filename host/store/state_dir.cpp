@@ -1,0 +1,103 @@
+#include "host/store/state_dir.h"
+
+#include <fcntl.h>
+#include <sys/file.h>
+#include <sys/stat.h>
+#include <unistd.h>
+
+#include <array>
+#include <cerrno>
+#include <string>
+
+#include "host/store/store_error.h"
+
+namespace ovhost
+{
+namespace
+{
+
+void make_directory(const std::filesystem::path &dir)
+{
+    if (::mkdir(dir.c_str(), 0700) == 0 || errno == EEXIST)
+        return;
+    const int cause = errno;
+    const std::string what =
+        "cannot make the state directory " + dir.string() + ": " + system_message(cause) + "; ";
+    if (cause == ENOENT)
+        throw StoreError(what + "make its parent directory first");
+    throw StoreError(what + "make it, or choose another state directory");
+}
+
+void check_directory(const std::filesystem::path &dir)
+{
+    struct stat about {
+    };
+    if (::stat(dir.c_str(), &about) == 0 && !S_ISDIR(about.st_mode)) {
+        throw StoreError("the state directory " + dir.string() +
+                         " is not a directory; move it away, or choose another state directory");
+    }
+    if (::faccessat(AT_FDCWD, dir.c_str(), R_OK | W_OK | X_OK, AT_EACCESS) == 0)
+        return;
+    throw StoreError("the state directory " + dir.string() +
+                     " cannot be written: " + system_message(errno) +
+                     "; give this user write permission, or choose another state directory");
+}
+
+UniqueFd open_lock(const std::filesystem::path &file)
+{
+    UniqueFd lock(
+        ::open(file.c_str(), O_RDWR | O_CREAT | O_CLOEXEC | O_NOFOLLOW | O_NONBLOCK, 0600));
+    if (lock)
+        return lock;
+    throw StoreError("cannot open the lock file " + file.string() + ": " + system_message(errno) +
+                     "; move it away, or give this user read and write permission");
+}
+
+// "" when the holder has not written its number.
+std::string read_holder(int lock)
+{
+    std::array<char, 24> digits{};
+    const ssize_t size = ::pread(lock, digits.data(), digits.size(), 0);
+    if (size <= 0)
+        return {};
+    const std::string text(digits.data(), static_cast<std::size_t>(size));
+    return text.substr(0, text.find_first_not_of("0123456789"));
+}
+
+// Only for the message of the next one who tries: the lock holds without it, on a full disk too.
+void write_holder(int lock)
+{
+    const std::string text = std::to_string(::getpid()) + "\n";
+    if (::ftruncate(lock, 0) != 0)
+        return;
+    [[maybe_unused]] const ssize_t written = ::pwrite(lock, text.data(), text.size(), 0);
+}
+
+[[noreturn]] void throw_lock_failure(const std::filesystem::path &dir, int lock, int cause)
+{
+    if (cause != EWOULDBLOCK) {
+        throw StoreError("cannot lock " + (dir / "lock").string() + ": " + system_message(cause) +
+                         "; choose a state directory on a file system with file locks");
+    }
+    const std::string holder = read_holder(lock);
+    throw StoreError("the state directory " + dir.string() + " is held by another daemon" +
+                     (holder.empty() ? "" : " (process " + holder + ")") +
+                     "; end that daemon, or choose another state directory");
+}
+
+} // namespace
+
+StateDir::StateDir(std::filesystem::path dir) : path_(std::move(dir))
+{
+    make_directory(path_);
+    check_directory(path_);
+    lock_ = open_lock(path_ / "lock");
+    // flock and not fcntl: it also keeps out a second store of the same process, and does not
+    // end when another descriptor of the file is closed.
+    if (::flock(lock_.get(), LOCK_EX | LOCK_NB) != 0) {
+        throw_lock_failure(path_, lock_.get(), errno);
+    }
+    write_holder(lock_.get());
+}
+
+} // namespace ovhost

@@ -1,0 +1,71 @@
+// The durable store: the configuration as it was last committed, in an SQLite database
+// (config.db) of the state directory. It knows nodes only as name, type and text; the commit
+// engine hands it the changes of each commit and loads all nodes at start.
+// Neighbours: state_dir.h keeps other daemons out, database_file.h judges the file.
+#pragma once
+
+#include <cstdint>
+#include <filesystem>
+#include <functional>
+#include <memory>
+#include <optional>
+#include <span>
+#include <string>
+
+#include "host/store/store_error.h"
+
+namespace ovhost
+{
+
+struct StoredValue {
+    std::uint32_t type = 0;
+    std::string text;
+};
+
+struct StoredNode {
+    std::string name;
+    std::uint32_t type = 0;
+    std::string text;
+};
+
+struct StoredChange {
+    std::string name;
+    std::optional<StoredValue> after; // none: the node is removed
+};
+
+// Belongs to one thread at a time.
+class Store
+{
+  public:
+    // Opens the store of this directory, or makes an empty one. The directory is made when only
+    // its last component is missing, and is held until the store's end. Throws StoreError; what
+    // was found and refused is left as it is.
+    [[nodiscard]] static Store open(const std::filesystem::path &state_dir);
+
+    Store(Store &&other) noexcept;
+    Store &operator=(Store &&other) noexcept;
+    ~Store();
+
+    // Whether no commit was ever stored.
+    [[nodiscard]] bool empty() const noexcept { return commit_number() == 0; }
+
+    // The number of the last stored commit; the first is 1.
+    [[nodiscard]] std::uint64_t commit_number() const noexcept;
+
+    // Hands out every node, in the byte order of the names. Throws StoreError.
+    void load(const std::function<void(StoredNode &&)> &take) const;
+
+    // Stores one commit, all of it or nothing, and answers its number. When it returns, the
+    // commit is on the disk. The changes count in their order; removing a node that is not there
+    // is no error. Throws StoreError: then the store is as it was, and can be used on.
+    std::uint64_t commit(std::span<const StoredChange> changes);
+
+  private:
+    struct Parts;
+
+    explicit Store(std::unique_ptr<Parts> parts) noexcept;
+
+    std::unique_ptr<Parts> parts_;
+};
+
+} // namespace ovhost

@@ -1,0 +1,321 @@
+// What Store::open refuses, the words it refuses it with, and that it leaves every byte alone.
+
+#include <fcntl.h>
+#include <gmock/gmock.h>
+#include <gtest/gtest.h>
+#include <sqlite3.h>
+#include <sys/stat.h>
+
+#include "host/store/store.h"
+#include "tests/store/child.h"
+#include "tests/store/scratch_dir.h"
+#include "tests/store/store_testing.h"
+
+namespace
+{
+
+namespace fs = std::filesystem;
+using ovhost::Store;
+using ovtest::Files;
+using ovtest::files_of;
+using ovtest::Nodes;
+using ovtest::nodes_of;
+using ovtest::numbered;
+using ovtest::put;
+using ovtest::read_file;
+using ovtest::refusal;
+using ovtest::run_sql;
+using ovtest::ScratchDir;
+using ovtest::write_file;
+using testing::HasSubstr;
+using testing::StartsWith;
+
+constexpr std::size_t kPage = 4096;
+
+class StoreDamage : public testing::Test
+{
+  protected:
+    ScratchDir scratch_;
+    fs::path file_ = scratch_ / "config.db";
+
+    void make_store(int nodes = 1)
+    {
+        Store store = Store::open(scratch_.path());
+        store.commit(numbered(nodes, "some text to fill the pages"));
+    }
+
+    // Opening must fail and change nothing.
+    std::string refused()
+    {
+        const Files before = files_of(scratch_.path());
+        std::string message = refusal(scratch_.path());
+        EXPECT_EQ(files_of(scratch_.path()), before) << message;
+        return message;
+    }
+
+    [[nodiscard]] std::string damaged(const std::string &how) const
+    {
+        return "the configuration database " + file_.string() + " is damaged (" + how +
+               "); the file was left as it was: put a good copy in its place, or move it and its"
+               " -wal file away to begin with an empty store";
+    }
+
+    [[nodiscard]] std::string foreign(const std::string &how) const
+    {
+        return file_.string() + " is not a configuration database of this program (" + how +
+               "); the file was left as it was: move it away, or choose another state directory";
+    }
+};
+
+TEST_F(StoreDamage, AnEmptyFileHasLostItsContent)
+{
+    make_store();
+    fs::resize_file(file_, 0);
+    EXPECT_EQ(refusal(scratch_.path()), damaged("it is empty"));
+    EXPECT_EQ(fs::file_size(file_), 0U);
+}
+
+TEST_F(StoreDamage, AFileThatEndsWithinItsHeader)
+{
+    make_store();
+    for (const unsigned size : {1U, 15U, 16U, 99U}) {
+        fs::resize_file(file_, size);
+        EXPECT_EQ(refused(), damaged("it ends within its header")) << size;
+        fs::remove(file_);
+        make_store();
+    }
+}
+
+TEST_F(StoreDamage, ATextFile)
+{
+    write_file(file_, "these are not the pages of a database\n");
+    EXPECT_EQ(refused(), foreign("it does not begin like an SQLite database"));
+}
+
+TEST_F(StoreDamage, AFileCutAnywhere)
+{
+    make_store(300);
+    const std::string whole = read_file(file_);
+    ASSERT_GE(whole.size(), 4 * kPage);
+    for (std::size_t size = 100; size < whole.size(); size += kPage / 2) {
+        write_file(file_, whole.substr(0, size));
+        EXPECT_THAT(refused(),
+                    StartsWith("the configuration database " + file_.string() + " is damaged ("))
+            << size;
+    }
+    write_file(file_, whole);
+    EXPECT_EQ(refusal(scratch_.path()), "");
+}
+
+TEST_F(StoreDamage, AnyPageOverwritten)
+{
+    make_store(300);
+    const std::string whole = read_file(file_);
+    for (std::size_t page = 0; page < whole.size(); page += kPage) {
+        std::string bytes = whole;
+        const std::size_t begin = page == 0 ? 100 : page;
+        bytes.replace(begin, page + kPage - begin, page + kPage - begin, '\xa5');
+        write_file(file_, bytes);
+        EXPECT_THAT(refused(),
+                    StartsWith("the configuration database " + file_.string() + " is damaged ("))
+            << page;
+    }
+}
+
+TEST_F(StoreDamage, AHeaderOfGarbage)
+{
+    make_store();
+    std::string bytes = read_file(file_);
+    bytes.replace(0, 100, 100, '\xa5');
+    write_file(file_, bytes);
+    EXPECT_EQ(refused(), foreign("it does not begin like an SQLite database"));
+}
+
+TEST_F(StoreDamage, ADamagedFileBesideALogWithCommits)
+{
+    make_store(300);
+    const ScratchDir copy;
+    {
+        Store store = Store::open(scratch_.path());
+        store.commit(numbered(1, "in the log"));
+        for (const char *name : {"config.db", "config.db-wal"}) {
+            fs::copy_file(scratch_ / name, copy / name);
+        }
+    }
+    ASSERT_EQ(nodes_of(Store::open(copy.path())).at("/n/0").second, "in the log");
+    fs::remove(copy / "config.db");
+    for (const auto &[name, bytes] : files_of(scratch_.path()))
+        write_file(copy / name, bytes);
+    {
+        Store store = Store::open(scratch_.path());
+        store.commit(numbered(1, "again in the log"));
+        for (const char *name : {"config.db", "config.db-wal"}) {
+            fs::copy_file(scratch_ / name, copy / name, fs::copy_options::overwrite_existing);
+        }
+    }
+    std::string bytes = read_file(copy / "config.db");
+    bytes.replace(kPage, bytes.size() - kPage, bytes.size() - kPage, '\xa5');
+    write_file(copy / "config.db", bytes);
+    const Files before = files_of(copy.path());
+    ASSERT_EQ(before.size(), 2U);
+    EXPECT_THAT(refusal(copy.path()), HasSubstr("config.db is damaged ("));
+    EXPECT_EQ(files_of(copy.path()), before);
+}
+
+TEST_F(StoreDamage, ADatabaseOfAnotherProgram)
+{
+    run_sql(file_, "CREATE TABLE their (a); INSERT INTO their VALUES (1)");
+    write_file(scratch_ / "config.db-journal", "their journal");
+    EXPECT_EQ(refused(), foreign("it belongs to another program"));
+    EXPECT_EQ(read_file(scratch_ / "config.db-journal"), "their journal");
+}
+
+TEST_F(StoreDamage, AnotherApplicationId)
+{
+    make_store();
+    run_sql(file_, "PRAGMA application_id = 1");
+    EXPECT_EQ(refused(), foreign("it belongs to another program"));
+}
+
+TEST_F(StoreDamage, OtherTables)
+{
+    for (const char *sql :
+         {"CREATE TABLE their (a)", "DROP TABLE nodes", "ALTER TABLE nodes ADD COLUMN more INTEGER",
+          "CREATE INDEX their ON nodes (text)",
+          "CREATE TRIGGER their AFTER INSERT ON nodes BEGIN DELETE FROM nodes;"
+          " END"}) {
+        make_store();
+        run_sql(file_, sql);
+        EXPECT_EQ(refused(), foreign("its tables are not this program's")) << sql;
+        fs::remove(file_);
+    }
+}
+
+TEST_F(StoreDamage, StatisticsOfTheTablesDoNoHarm)
+{
+    make_store();
+    run_sql(file_, "ANALYZE");
+    EXPECT_EQ(refusal(scratch_.path()), "");
+}
+
+TEST_F(StoreDamage, ANewerVersion)
+{
+    make_store();
+    run_sql(file_, "PRAGMA user_version = 2; CREATE TABLE later (a)");
+    EXPECT_EQ(refused(), "the configuration database " + file_.string() +
+                             " was written by a newer version of this program (its schema is"
+                             " version 2, this program knows up to 1); the file was left as it"
+                             " was: run the newer version");
+}
+
+TEST_F(StoreDamage, ANegativeVersion)
+{
+    make_store();
+    run_sql(file_, "PRAGMA user_version = -1");
+    EXPECT_EQ(refused(), damaged("its version is -1"));
+}
+
+TEST_F(StoreDamage, AMissingCommitNumber)
+{
+    make_store();
+    run_sql(file_, "DELETE FROM meta");
+    EXPECT_EQ(refused(), damaged("its commit number is missing"));
+}
+
+TEST_F(StoreDamage, AValueOutOfItsRange)
+{
+    make_store();
+    run_sql(file_, "PRAGMA ignore_check_constraints = 1; UPDATE nodes SET type = -1");
+    EXPECT_EQ(refused(), damaged("CHECK constraint failed in nodes"));
+}
+
+TEST_F(StoreDamage, ADirectory)
+{
+    fs::create_directory(file_);
+    write_file(file_ / "inside", "kept");
+    EXPECT_EQ(refusal(scratch_.path()), foreign("it is a directory"));
+    EXPECT_EQ(read_file(file_ / "inside"), "kept");
+}
+
+TEST_F(StoreDamage, AnotherKindOfFile)
+{
+    ASSERT_EQ(::mkfifo(file_.c_str(), 0600), 0);
+    EXPECT_EQ(refusal(scratch_.path()), foreign("it is not a regular file"));
+    EXPECT_TRUE(fs::is_fifo(file_));
+}
+
+TEST_F(StoreDamage, ALinkThatLeadsNowhere)
+{
+    fs::create_symlink("nowhere", file_);
+    EXPECT_EQ(refusal(scratch_.path()), "cannot name the new database " + file_.string() +
+                                            ": File exists; move what has this name away");
+    EXPECT_EQ(fs::read_symlink(file_), "nowhere");
+}
+
+TEST_F(StoreDamage, AFileThisUserMayNotReadOrWrite)
+{
+    make_store();
+    for (const mode_t mode : {0000U, 0444U}) {
+        fs::remove(scratch_ / "lock");
+        ASSERT_EQ(::chmod(file_.c_str(), mode), 0);
+        ASSERT_EQ(::chmod(scratch_.path().c_str(), 0777), 0);
+        EXPECT_EQ(ovtest::in_child([&] {
+                      ovtest::become_unprivileged();
+                      return refusal(scratch_.path());
+                  }),
+                  "cannot open " + file_.string() +
+                      ": Permission denied; give this user read and write permission for it and"
+                      " its directory");
+    }
+}
+
+TEST_F(StoreDamage, AFileInUseByAnotherProgram)
+{
+    make_store();
+    sqlite3 *other = nullptr;
+    ASSERT_EQ(sqlite3_open(file_.c_str(), &other), SQLITE_OK);
+    ASSERT_EQ(sqlite3_exec(other, "BEGIN IMMEDIATE", nullptr, nullptr, nullptr), SQLITE_OK);
+    const std::string message = ovtest::in_child([&] { return refusal(scratch_.path()); });
+    sqlite3_close(other);
+    EXPECT_EQ(message, "the configuration database " + file_.string() +
+                           " is in use by another program; end that program and try again");
+}
+
+TEST_F(StoreDamage, ALogWithoutItsDatabase)
+{
+    write_file(scratch_ / "config.db-wal", "perhaps commits");
+    EXPECT_EQ(refused(), "the configuration database " + file_.string() +
+                             " is missing but its log " + file_.string() +
+                             "-wal is there; put the database back, or move the log away to begin"
+                             " with an empty store");
+    EXPECT_FALSE(fs::exists(file_));
+}
+
+TEST_F(StoreDamage, WhatACrashLeftOfANewDatabaseIsNoHindrance)
+{
+    write_file(scratch_ / "config.db.new", "half");
+    write_file(scratch_ / "config.db.new-wal", "half");
+    EXPECT_EQ(refusal(scratch_.path()), "");
+    EXPECT_TRUE(Store::open(scratch_.path()).empty());
+    EXPECT_FALSE(fs::exists(scratch_ / "config.db.new"));
+    EXPECT_FALSE(fs::exists(scratch_ / "config.db.new-wal"));
+}
+
+TEST_F(StoreDamage, ARefusalLetsTheDirectoryGo)
+{
+    write_file(file_, "text");
+    EXPECT_NE(refusal(scratch_.path()), "");
+    fs::remove(file_);
+    EXPECT_EQ(refusal(scratch_.path()), "");
+}
+
+TEST_F(StoreDamage, AStoreInUseIsHeldByItsDaemon)
+{
+    make_store();
+    const Store store = Store::open(scratch_.path());
+    EXPECT_THAT(refusal(scratch_.path()),
+                StartsWith("the state directory " + scratch_.path().string() +
+                           " is held by another daemon (process "));
+}
+
+} // namespace
