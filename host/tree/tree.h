@@ -4,7 +4,10 @@
 //
 // A Tree is a cheap handle. Copies share structure; set() and erase() on one copy leave every other
 // copy as it was, so that a commit's old and new databases are two handles and a reader never sees
-// half a commit.
+// half a commit. A change copies only the nodes on the way to it, and none at all when no other
+// handle shares them. Handles that share structure belong to one thread.
+//
+// The node without a name, "/", always exists. Names are lists of unescaped components here.
 
 #include "framework/bnode.h"
 
@@ -15,9 +18,15 @@
 #include <string>
 #include <vector>
 
-namespace ovhost {
+namespace ovhost
+{
 
 class NamePattern;
+class Tree;
+struct Change;
+struct TreeNode;
+
+[[nodiscard]] std::vector<Change> diff(const Tree &before, const Tree &after);
 
 struct Value {
     bn_type type = 0;
@@ -49,22 +58,28 @@ class Tree
     [[nodiscard]] std::vector<std::string> matching(const NamePattern &pattern) const;
 
     /// Visits every node that holds a value at or below `below`, parents before children, in order.
+    /// The visitor may change this tree; it goes on seeing the tree as it was.
     void visit(const Visitor &visitor, Parts below = {}) const;
 
     /// Number of nodes that hold a value.
     [[nodiscard]] std::size_t size() const;
 
-    /// Writes a node's value; missing parents come into being without one.
+    /// Writes a node's value; missing parents come into being without one. Throws
+    /// std::invalid_argument when the components form no name (see is_valid_name()).
     void set(Parts name, Value value);
 
     /// Removes a node and everything below it; parents that hold no value and have lost their last
-    /// child go with it. False when there was no such node.
+    /// child go with it. False when there was no such node. Erasing "/" empties the tree, and is
+    /// false when it was empty.
     bool erase(Parts name);
 
   private:
-    struct Node;
-    friend struct TreeDiff;
-    std::shared_ptr<const Node> root_;
+    friend std::vector<Change> diff(const Tree &before, const Tree &after);
+
+    [[nodiscard]] const TreeNode *find(Parts name) const;
+
+    /// Null when the tree is empty.
+    std::shared_ptr<TreeNode> root_;
 };
 
 } // namespace ovhost
