@@ -5,7 +5,7 @@
 
 #include "host/control/framing.h"
 #include "host/control/request_error.h"
-#include "host/control/unique_fd.h"
+#include "host/support/unique_fd.h"
 
 #include <nlohmann/json_fwd.hpp>
 

@@ -6,7 +6,7 @@
 #include "host/control/framing.h"
 #include "host/control/output_queue.h"
 #include "host/control/request_handler.h"
-#include "host/control/unique_fd.h"
+#include "host/support/unique_fd.h"
 
 #include <chrono>
 #include <cstddef>

@@ -2,7 +2,7 @@
 // The event loop of a daemon: an event_base with the signals and the wake-up every daemon needs.
 // server.h hangs its sockets into it.
 
-#include "host/control/unique_fd.h"
+#include "host/support/unique_fd.h"
 
 #include <functional>
 #include <memory>

@@ -1,7 +1,7 @@
 #pragma once
 // The listening socket of the daemon and the file it is bound to. server.h accepts from it.
 
-#include "host/control/unique_fd.h"
+#include "host/support/unique_fd.h"
 
 #include <sys/types.h>
 

@@ -1,6 +1,6 @@
 #include "host/control/socket_address.h"
 
-#include "host/control/unique_fd.h"
+#include "host/support/unique_fd.h"
 
 #include <sys/socket.h>
 

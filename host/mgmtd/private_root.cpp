@@ -15,7 +15,7 @@
 #include <system_error>
 #include <vector>
 
-#include "host/store/unique_fd.h"
+#include "host/support/unique_fd.h"
 
 namespace ovhost
 {

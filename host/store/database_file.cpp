@@ -13,7 +13,7 @@
 
 #include "host/store/schema.h"
 #include "host/store/store_error.h"
-#include "host/store/unique_fd.h"
+#include "host/support/unique_fd.h"
 
 namespace ovhost
 {
@@ -113,7 +113,7 @@ void check_header(const fs::path &file)
     }
 }
 
-void check_version(const Connection &db, const fs::path &file)
+void check_version(const SqliteConnection &db, const fs::path &file)
 {
     const std::int64_t version = db.integer("PRAGMA user_version");
     if (version < 0)
@@ -127,7 +127,7 @@ void check_version(const Connection &db, const fs::path &file)
                      "); the file was left as it was: run the newer version");
 }
 
-void check_content(const Connection &db, const fs::path &file)
+void check_content(const SqliteConnection &db, const fs::path &file)
 {
     const std::string verdict = db.text("PRAGMA quick_check(1)");
     if (verdict != "ok")
@@ -142,15 +142,15 @@ void check_content(const Connection &db, const fs::path &file)
 
 // Every commit is on the disk before it is acknowledged. No other process is to read or write
 // meanwhile, which also spares the shared-memory file.
-Connection connect(const fs::path &file)
+SqliteConnection connect(const fs::path &file)
 {
-    Connection db(file);
+    SqliteConnection db(file);
     db.execute("PRAGMA locking_mode = EXCLUSIVE; PRAGMA synchronous = FULL");
     return db;
 }
 
 // SQLite answers the mode in use and no error when it cannot change it.
-void use_log(const Connection &db)
+void use_log(const SqliteConnection &db)
 {
     const std::string mode = db.text("PRAGMA journal_mode = WAL");
     if (mode != "wal")
@@ -178,7 +178,7 @@ void write_new_database(const fs::path &file)
     if (!made)
         throw_system("make " + file.string(), errno, kPermissionAdvice);
     {
-        Connection db = connect(file);
+        SqliteConnection db = connect(file);
         use_log(db);
         upgrade_schema(db);
         db.execute("PRAGMA wal_checkpoint(TRUNCATE)");
@@ -207,7 +207,7 @@ void check_no_orphaned_log(const fs::path &file)
 void create_database(const fs::path &file)
 {
     check_no_orphaned_log(file);
-    const fs::path unfinished = file.string() + ".new";
+    const fs::path unfinished = file;
     for (const char *side : {"", "-wal", "-journal"})
         remove_file(unfinished.string() + side);
     write_new_database(unfinished);
@@ -227,12 +227,12 @@ bool is_missing(const fs::path &file)
 
 } // namespace
 
-Connection open_database(const fs::path &file)
+SqliteConnection open_database(const fs::path &file)
 try {
     if (is_missing(file))
         create_database(file);
     check_header(file);
-    Connection db = connect(file);
+    SqliteConnection db = connect(file);
     check_version(db, file);
     check_content(db, file);
     db.checkpoint_on_close();

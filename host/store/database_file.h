@@ -12,6 +12,6 @@ namespace ovhost
 
 // Opens DIR/config.db of a state directory that this process holds, or makes it when it is
 // missing. Throws StoreError.
-[[nodiscard]] Connection open_database(const std::filesystem::path &file);
+[[nodiscard]] SqliteConnection open_database(const std::filesystem::path &file);
 
 } // namespace ovhost

@@ -24,7 +24,7 @@ constexpr std::array kSteps{
        ) WITHOUT ROWID, STRICT;)",
 };
 
-void run_steps(const Connection &db, std::int64_t from, std::int64_t to)
+void run_steps(const SqliteConnection &db, std::int64_t from, std::int64_t to)
 {
     for (std::int64_t version = from; version < to; ++version) {
         db.execute(kSteps[static_cast<std::size_t>(version)]);
@@ -38,7 +38,7 @@ std::int64_t schema_version() noexcept
     return static_cast<std::int64_t>(kSteps.size());
 }
 
-void upgrade_schema(const Connection &db)
+void upgrade_schema(const SqliteConnection &db)
 {
     const std::int64_t version = db.integer("PRAGMA user_version");
     if (version == schema_version())
@@ -50,7 +50,7 @@ void upgrade_schema(const Connection &db)
     db.execute("COMMIT");
 }
 
-std::vector<std::string> schema_of(const Connection &db)
+std::vector<std::string> schema_of(const SqliteConnection &db)
 {
     // SQLite's own entries, such as ANALYZE's statistics, do no harm.
     Statement query =
@@ -64,7 +64,7 @@ std::vector<std::string> schema_of(const Connection &db)
 
 std::vector<std::string> expected_schema(std::int64_t version)
 {
-    const Connection db = Connection::in_memory();
+    const SqliteConnection db = SqliteConnection::in_memory();
     run_steps(db, 0, version);
     return schema_of(db);
 }

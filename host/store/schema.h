@@ -10,7 +10,7 @@
 namespace ovhost
 {
 
-class Connection;
+class SqliteConnection;
 
 // "ovmd": tells the store's databases from those of other programs.
 inline constexpr std::int32_t kApplicationId = 0x6f766d64;
@@ -19,10 +19,10 @@ inline constexpr std::int32_t kApplicationId = 0x6f766d64;
 [[nodiscard]] std::int64_t schema_version() noexcept;
 
 // Brings a database of an older version to schema_version(), in one transaction.
-void upgrade_schema(const Connection &db);
+void upgrade_schema(const SqliteConnection &db);
 
 // What the database's tables, indexes and triggers look like, in the order of their names.
-[[nodiscard]] std::vector<std::string> schema_of(const Connection &db);
+[[nodiscard]] std::vector<std::string> schema_of(const SqliteConnection &db);
 
 // What schema_of() answers for a sound database of this version.
 [[nodiscard]] std::vector<std::string> expected_schema(std::int64_t version);

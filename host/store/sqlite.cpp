@@ -26,7 +26,7 @@ namespace
     throw SqliteError(code, what);
 }
 
-Statement first_row(const Connection &db, std::string_view sql)
+Statement first_row(const SqliteConnection &db, std::string_view sql)
 {
     Statement query = db.prepare(sql);
     if (!query.step()) {
@@ -110,19 +110,19 @@ std::string Statement::text(int column) const
     return {static_cast<const char *>(bytes), static_cast<std::size_t>(size)};
 }
 
-void Connection::Close::operator()(sqlite3 *db) const noexcept
+void SqliteConnection::Close::operator()(sqlite3 *db) const noexcept
 {
     sqlite3_close_v2(db);
 }
 
-Connection::Connection(const std::filesystem::path &file)
-    : Connection(std::filesystem::absolute(file).string(),
-                 SQLITE_OPEN_READWRITE | SQLITE_OPEN_NOMUTEX)
+SqliteConnection::SqliteConnection(const std::filesystem::path &file)
+    : SqliteConnection(std::filesystem::absolute(file).string(),
+                       SQLITE_OPEN_READWRITE | SQLITE_OPEN_NOMUTEX)
 {
     sqlite3_db_config(db_.get(), SQLITE_DBCONFIG_NO_CKPT_ON_CLOSE, 1, nullptr);
 }
 
-Connection::Connection(const std::string &name, int flags)
+SqliteConnection::SqliteConnection(const std::string &name, int flags)
 {
     sqlite3 *db = nullptr;
     const int status = sqlite3_open_v2(name.c_str(), &db, flags, nullptr);
@@ -133,22 +133,22 @@ Connection::Connection(const std::string &name, int flags)
         throw_last_error(db);
 }
 
-Connection Connection::in_memory()
+SqliteConnection SqliteConnection::in_memory()
 {
     return {":memory:", SQLITE_OPEN_READWRITE | SQLITE_OPEN_MEMORY | SQLITE_OPEN_NOMUTEX};
 }
 
-void Connection::checkpoint_on_close()
+void SqliteConnection::checkpoint_on_close()
 {
     sqlite3_db_config(db_.get(), SQLITE_DBCONFIG_NO_CKPT_ON_CLOSE, 0, nullptr);
 }
 
-Statement Connection::prepare(std::string_view sql) const
+Statement SqliteConnection::prepare(std::string_view sql) const
 {
     return {db_.get(), sql};
 }
 
-void Connection::execute(const std::string &sql) const
+void SqliteConnection::execute(const std::string &sql) const
 {
     errno = 0;
     if (sqlite3_exec(db_.get(), sql.c_str(), nullptr, nullptr, nullptr) != SQLITE_OK) {
@@ -156,17 +156,17 @@ void Connection::execute(const std::string &sql) const
     }
 }
 
-std::int64_t Connection::integer(std::string_view sql) const
+std::int64_t SqliteConnection::integer(std::string_view sql) const
 {
     return first_row(*this, sql).integer(0);
 }
 
-std::string Connection::text(std::string_view sql) const
+std::string SqliteConnection::text(std::string_view sql) const
 {
     return first_row(*this, sql).text(0);
 }
 
-bool Connection::in_transaction() const noexcept
+bool SqliteConnection::in_transaction() const noexcept
 {
     return sqlite3_get_autocommit(db_.get()) == 0;
 }

@@ -59,15 +59,15 @@ class Statement
     std::unique_ptr<sqlite3_stmt, Finalize> statement_;
 };
 
-class Connection
+class SqliteConnection
 {
   public:
     // Opens an existing database for reading and writing. A database is not changed by opening
     // it, nor by closing it again before checkpoint_on_close().
-    explicit Connection(const std::filesystem::path &file);
+    explicit SqliteConnection(const std::filesystem::path &file);
 
     // A database of its own in memory.
-    [[nodiscard]] static Connection in_memory();
+    [[nodiscard]] static SqliteConnection in_memory();
 
     // Lets the end of the connection move the write-ahead log's content into the database.
     void checkpoint_on_close();
@@ -89,7 +89,7 @@ class Connection
         void operator()(sqlite3 *db) const noexcept;
     };
 
-    Connection(const std::string &name, int flags);
+    SqliteConnection(const std::string &name, int flags);
 
     std::unique_ptr<sqlite3, Close> db_;
 };

@@ -4,7 +4,7 @@
 
 #include <filesystem>
 
-#include "host/store/unique_fd.h"
+#include "host/support/unique_fd.h"
 
 namespace ovhost
 {

@@ -13,7 +13,7 @@ namespace ovhost
 struct Store::Parts {
     StateDir dir;
     std::filesystem::path file;
-    Connection db;
+    SqliteConnection db;
     Statement begin;
     Statement put;
     Statement remove;

@@ -62,11 +62,7 @@ TEST(StateDir, ASecondHolderIsRefusedWithTheNumberOfTheFirst)
         "the state directory " + scratch.path().string() + " is held by another daemon (process " +
         std::to_string(::getpid()) + "); end that daemon, or choose another state directory";
     EXPECT_EQ(lock_refusal(scratch.path()), expected);
-    EXPECT_EQ(in_child([&] {
-                  // The child's copy of the first holder's descriptor stays out of this.
-                  return lock_refusal(scratch.path());
-              }),
-              expected);
+    EXPECT_EQ(in_child([&] { return lock_refusal(scratch.path()); }), expected);
 }
 
 TEST(StateDir, ARefusalWithoutAKnownHolderSaysSo)

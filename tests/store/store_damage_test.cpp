@@ -18,16 +18,13 @@ namespace fs = std::filesystem;
 using ovhost::Store;
 using ovtest::Files;
 using ovtest::files_of;
-using ovtest::Nodes;
 using ovtest::nodes_of;
 using ovtest::numbered;
-using ovtest::put;
 using ovtest::read_file;
 using ovtest::refusal;
 using ovtest::run_sql;
 using ovtest::ScratchDir;
 using ovtest::write_file;
-using testing::HasSubstr;
 using testing::StartsWith;
 
 constexpr std::size_t kPage = 4096;
@@ -131,35 +128,29 @@ TEST_F(StoreDamage, AHeaderOfGarbage)
     EXPECT_EQ(refused(), foreign("it does not begin like an SQLite database"));
 }
 
+// The files of a store in use are those a killed daemon leaves.
 TEST_F(StoreDamage, ADamagedFileBesideALogWithCommits)
 {
     make_store(300);
-    const ScratchDir copy;
+    Files killed;
     {
         Store store = Store::open(scratch_.path());
         store.commit(numbered(1, "in the log"));
-        for (const char *name : {"config.db", "config.db-wal"}) {
-            fs::copy_file(scratch_ / name, copy / name);
-        }
+        killed = files_of(scratch_.path());
     }
-    ASSERT_EQ(nodes_of(Store::open(copy.path())).at("/n/0").second, "in the log");
-    fs::remove(copy / "config.db");
-    for (const auto &[name, bytes] : files_of(scratch_.path()))
-        write_file(copy / name, bytes);
-    {
-        Store store = Store::open(scratch_.path());
-        store.commit(numbered(1, "again in the log"));
-        for (const char *name : {"config.db", "config.db-wal"}) {
-            fs::copy_file(scratch_ / name, copy / name, fs::copy_options::overwrite_existing);
-        }
-    }
-    std::string bytes = read_file(copy / "config.db");
-    bytes.replace(kPage, bytes.size() - kPage, bytes.size() - kPage, '\xa5');
-    write_file(copy / "config.db", bytes);
-    const Files before = files_of(copy.path());
-    ASSERT_EQ(before.size(), 2U);
-    EXPECT_THAT(refusal(copy.path()), HasSubstr("config.db is damaged ("));
-    EXPECT_EQ(files_of(copy.path()), before);
+    ASSERT_EQ(killed.size(), 2U);
+    for (const auto &[name, bytes] : killed)
+        write_file(scratch_ / name, bytes);
+    EXPECT_EQ(nodes_of(Store::open(scratch_.path())).at("/n/0").second, "in the log");
+
+    std::string &database = killed.at("config.db");
+    const std::size_t size = database.size() - kPage;
+    database.replace(kPage, size, size, '\xa5');
+    for (const auto &[name, bytes] : killed)
+        write_file(scratch_ / name, bytes);
+    EXPECT_THAT(refused(),
+                StartsWith("the configuration database " + file_.string() + " is damaged ("));
+    EXPECT_EQ(files_of(scratch_.path()), killed);
 }
 
 TEST_F(StoreDamage, ADatabaseOfAnotherProgram)

@@ -33,13 +33,14 @@ using ovtest::ScratchDir;
 struct Faults {
     bool active = false;
     bool lasting = false;
+    bool flushes_only = false;
     int fail_at = 0;
     int seen = 0;
     int hits = 0;
 
-    bool hit()
+    bool hit(bool flush)
     {
-        if (!active)
+        if (!active || (flushes_only && !flush))
             return false;
         ++seen;
         if (seen < fail_at || (seen > fail_at && !lasting))
@@ -54,7 +55,10 @@ Faults faults;
 class FaultsFrom
 {
   public:
-    FaultsFrom(int fail_at, bool lasting) { faults = {true, lasting, fail_at, 0, 0}; }
+    FaultsFrom(int fail_at, bool lasting, bool flushes_only = false)
+    {
+        faults = {true, lasting, flushes_only, fail_at, 0, 0};
+    }
     FaultsFrom(const FaultsFrom &) = delete;
     FaultsFrom &operator=(const FaultsFrom &) = delete;
     ~FaultsFrom() { faults.active = false; }
@@ -62,7 +66,7 @@ class FaultsFrom
 
 ssize_t failing_write(int fd, const void *bytes, std::size_t size)
 {
-    if (!faults.hit())
+    if (!faults.hit(false))
         return ::write(fd, bytes, size);
     errno = ENOSPC;
     return -1;
@@ -70,7 +74,7 @@ ssize_t failing_write(int fd, const void *bytes, std::size_t size)
 
 ssize_t failing_pwrite(int fd, const void *bytes, std::size_t size, off_t offset)
 {
-    if (!faults.hit())
+    if (!faults.hit(false))
         return ::pwrite(fd, bytes, size, offset);
     errno = ENOSPC;
     return -1;
@@ -78,7 +82,7 @@ ssize_t failing_pwrite(int fd, const void *bytes, std::size_t size, off_t offset
 
 int failing_ftruncate(int fd, off_t size)
 {
-    if (!faults.hit())
+    if (!faults.hit(false))
         return ::ftruncate(fd, size);
     errno = EIO;
     return -1;
@@ -101,7 +105,7 @@ void put_faults_beneath_sqlite()
 
 int failing_flush(long call, int fd)
 {
-    if (!faults.hit())
+    if (!faults.hit(true))
         return static_cast<int>(::syscall(call, fd));
     errno = EIO;
     return -1;
@@ -202,6 +206,19 @@ TEST_P(StoreFault, ACommitIsStoredWholeOrNotAtAll)
         EXPECT_EQ(content_of(Store::open(scratch.path())), expected);
     }
     EXPECT_GT(refusals, 2);
+}
+
+TEST_P(StoreFault, NoCommitIsAcknowledgedBeforeItIsOnTheDisk)
+{
+    const ScratchDir scratch;
+    Store store = Store::open(scratch.path());
+    // The first commit begins the log, which is flushed for its own sake.
+    store.commit(std::vector{put("/a", "1")});
+    for (int round = 0; round < 3; ++round) {
+        const FaultsFrom active(1, GetParam(), true);
+        EXPECT_THROW(store.commit(std::vector{put("/b", "1")}), StoreError);
+    }
+    EXPECT_EQ(store.commit_number(), 1U);
 }
 
 TEST_P(StoreFault, ACommitThatMovesTheLogIntoTheDatabase)

@@ -1,5 +1,5 @@
 #pragma once
-// Owner of one file descriptor.
+// Owns a file descriptor.
 
 #include <unistd.h>
 
@@ -11,22 +11,24 @@ namespace ovhost
 class UniqueFd
 {
   public:
-    UniqueFd() = default;
-    explicit UniqueFd(int fd) : fd_(fd) {}
+    UniqueFd() noexcept = default;
+    explicit UniqueFd(int fd) noexcept : fd_(fd) {}
     UniqueFd(UniqueFd &&other) noexcept : fd_(std::exchange(other.fd_, -1)) {}
     UniqueFd &operator=(UniqueFd &&other) noexcept
     {
         std::swap(fd_, other.fd_);
         return *this;
     }
+    UniqueFd(const UniqueFd &) = delete;
+    UniqueFd &operator=(const UniqueFd &) = delete;
     ~UniqueFd()
     {
         if (fd_ >= 0)
             ::close(fd_);
     }
 
-    [[nodiscard]] int get() const { return fd_; }
-    [[nodiscard]] explicit operator bool() const { return fd_ >= 0; }
+    [[nodiscard]] int get() const noexcept { return fd_; }
+    [[nodiscard]] explicit operator bool() const noexcept { return fd_ >= 0; }
 
   private:
     int fd_ = -1;

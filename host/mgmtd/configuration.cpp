@@ -1,0 +1,105 @@
+#include "host/mgmtd/configuration.h"
+
+#include "framework/appliance.h"
+#include "framework/logging.h"
+#include "host/framework/appliance_config.h"
+#include "host/framework/log_config.h"
+#include "host/modules/default_values.h"
+#include "orvale/md_dyna_limits.h"
+
+#include <stdexcept>
+
+namespace ovhost
+{
+namespace
+{
+
+void log_line(int level, const std::string &text)
+{
+    log_host_line(level, "mgmtd", text);
+}
+
+DefaultsReport logged_defaults()
+{
+    return {
+        [](const DefaultsSummary &summary) {
+            log_line(ov_log_notice, summary.source + ": " + std::to_string(summary.set) + " set, " +
+                                        std::to_string(summary.removed) + " removed");
+        },
+        [](const std::string &warning) { log_line(ov_log_warning, warning); },
+    };
+}
+
+/// What a refused first commit says: every refusal, for there is no client to show them to.
+std::string describe(const CommitReport &report)
+{
+    std::string text = "the first configuration is refused";
+    for (const Refusal &refusal : report.refusals) {
+        text += "\n  " + refusal.node + ": " + refusal.message + " (" + refusal.module + ")";
+    }
+    return report.outcome == CommitOutcome::not_stored ? report.store_error : text;
+}
+
+} // namespace
+
+Configuration::Configuration(const std::filesystem::path &state_dir)
+    : store_(Store::open(state_dir)), adapter_(store_), engine_(adapter_)
+{
+    // Order counts: checks refuse before anything follows, and events tell of what is done.
+    engine_.add_module(schema_);
+    engine_.add_module(limits_);
+    engine_.add_module(events_);
+    engine_.load();
+    candidate_.discard(engine_.running());
+    set_running_db_source([this] { return running_db(); });
+}
+
+Configuration::~Configuration()
+{
+    set_running_db_source({});
+}
+
+const mdb_db *Configuration::running_db()
+{
+    running_db_.tree = engine_.running();
+    return &running_db_;
+}
+
+void Configuration::build_first()
+{
+    apply_default_values(candidate_, logged_defaults());
+    const CommitReport report = engine_.initial(candidate_);
+    if (!report.accepted()) {
+        throw std::runtime_error(describe(report));
+    }
+    for (const Warning &warning : report.warnings) {
+        log_line(ov_log_warning, warning.message);
+    }
+    // Only now are the preserved values safe in the store.
+    retire_preserved_values();
+    log_line(ov_log_notice,
+             "first configuration stored: " + std::to_string(running().size()) + " nodes");
+}
+
+void Configuration::start()
+{
+    if (store_.empty()) {
+        build_first();
+    }
+    if (const int err = init_model_info(running_db()); err != 0) {
+        throw std::runtime_error("the model's limits cannot be read from the configuration (error "
+                                 "code " +
+                                 std::to_string(err) + "): see the log for the node");
+    }
+    // The file may have been lost while the daemon was away; the library logs why it fails.
+    if (write_dyna_limits_conf(running_db()) != 0) {
+        log_line(ov_log_warning, "the limits file could not be written: is /var/opt/tms there?");
+    }
+}
+
+CommitReport Configuration::commit(const std::string &comment)
+{
+    return engine_.commit(candidate_, comment);
+}
+
+} // namespace ovhost

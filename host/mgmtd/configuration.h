@@ -1,0 +1,60 @@
+#pragma once
+// The daemon's configuration as a whole: the durable store, the engine with its modules, and the
+// one candidate that all clients edit. requests.h lets clients at it.
+
+#include "host/commit/candidate.h"
+#include "host/commit/engine.h"
+#include "host/framework/objects.h"
+#include "host/modules/change_events.h"
+#include "host/modules/limits.h"
+#include "host/modules/schema.h"
+#include "host/store/store.h"
+
+#include <cstdint>
+#include <filesystem>
+#include <string>
+
+namespace ovhost
+{
+
+class Configuration
+{
+  public:
+    /// Opens the store and takes up what it holds. Throws StoreError.
+    explicit Configuration(const std::filesystem::path &state_dir);
+    ~Configuration();
+    Configuration(const Configuration &) = delete;
+    Configuration &operator=(const Configuration &) = delete;
+
+    /// Builds the first configuration when the store is empty, and brings what follows the
+    /// configuration (model information, limits file) up to date. Throws std::runtime_error when
+    /// there is no configuration to run with.
+    void start();
+
+    [[nodiscard]] const Tree &running() const { return engine_.running(); }
+
+    /// The configuration in force, for the library's questions.
+    [[nodiscard]] const mdb_db *running_db();
+
+    [[nodiscard]] Candidate &candidate() { return candidate_; }
+
+    [[nodiscard]] CheckReport check() { return engine_.check(candidate_); }
+    [[nodiscard]] CommitReport commit(const std::string &comment);
+    void discard() { candidate_.discard(running()); }
+
+    [[nodiscard]] std::uint64_t commit_number() const { return store_.commit_number(); }
+
+  private:
+    void build_first();
+
+    Store store_;
+    StoreAdapter adapter_;
+    SchemaModule schema_;
+    LimitsModule limits_;
+    ChangeEventsModule events_;
+    CommitEngine engine_;
+    Candidate candidate_;
+    mdb_db running_db_;
+};
+
+} // namespace ovhost

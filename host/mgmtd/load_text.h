@@ -1,0 +1,32 @@
+#pragma once
+// A text in the format of the default databases (orvale/md_db_default.h) as edits of a candidate.
+
+#include "host/commit/candidate.h"
+
+#include <string>
+#include <string_view>
+#include <vector>
+
+namespace ovhost
+{
+
+/// What is wrong with one line, counted from 1.
+struct LineFault {
+    long line = 0;
+    std::string node; ///< empty when the line has none
+    std::string message;
+
+    bool operator==(const LineFault &) const = default;
+};
+
+struct LoadResult {
+    std::size_t set = 0;
+    std::size_t removed = 0;
+    std::vector<LineFault> faults;
+};
+
+/// Applies the text to the candidate, or leaves the candidate alone when any line has a fault; then
+/// all of them are told. Removing a node that is not there is no fault.
+[[nodiscard]] LoadResult load_text(Candidate &candidate, std::string_view text);
+
+} // namespace ovhost

@@ -1,0 +1,74 @@
+// The management daemon: puts the parts together, runs until a signal ends it.
+
+#include "framework/logging.h"
+#include "host/control/event_loop.h"
+#include "host/control/server.h"
+#include "host/framework/appliance_config.h"
+#include "host/framework/log_config.h"
+#include "host/mgmtd/configuration.h"
+#include "host/mgmtd/options.h"
+#include "host/mgmtd/peer_sessions.h"
+#include "host/mgmtd/private_root.h"
+#include "host/mgmtd/requests.h"
+
+#include <cstdio>
+#include <optional>
+#include <string>
+
+namespace
+{
+
+using namespace ovhost;
+
+void log_control_line(ControlLogLevel level, const std::string &text)
+{
+    constexpr int levels[] = {ov_log_error, ov_log_warning, ov_log_info, ov_log_debug};
+    log_host_line(levels[static_cast<int>(level)], "control", text);
+}
+
+void run(const DaemonOptions &options)
+{
+    G_daemon_log_level = static_cast<signed char>(options.log_level);
+    ov_log_module_levels[ov_log_module_ovmd] = static_cast<unsigned char>(options.module_log_level);
+    if (!options.root.empty()) {
+        enter_private_root(options.root);
+    }
+    set_config_name(options.model);
+
+    Configuration configuration(options.state_dir);
+    std::optional<PeerSessions> sessions;
+    ControlServer *server_view = nullptr;
+    Requests requests(configuration,
+                      {options.model, [&server_view] { return server_view->peers(); },
+                       [&sessions] { sessions->update(); }});
+    EventLoop loop;
+    loop.stop_on_signals();
+    ControlServer server(loop, options.socket, {}, requests, log_control_line);
+    server_view = &server;
+    sessions.emplace(server);
+
+    // The socket is ours before anything is built: a second daemon must not get that far.
+    configuration.start();
+    log_host_line(ov_log_notice, "mgmtd", "ready on " + options.socket);
+    const int signal = loop.run();
+    log_host_line(ov_log_notice, "mgmtd", "stopping on signal " + std::to_string(signal));
+    sessions.reset();
+}
+
+} // namespace
+
+int main(int argc, char **argv)
+{
+    int exit_code = 0;
+    const auto options = parse_options(argc, argv, exit_code);
+    if (!options) {
+        return exit_code;
+    }
+    try {
+        run(*options);
+    } catch (const std::exception &fault) {
+        std::fprintf(stderr, "mgmtd: %s\n", fault.what());
+        return 1;
+    }
+    return 0;
+}

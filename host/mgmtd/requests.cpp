@@ -1,0 +1,271 @@
+#include "host/mgmtd/requests.h"
+
+#include "framework/logging.h"
+#include "host/control/arguments.h"
+#include "host/control/server.h"
+#include "host/framework/log_config.h"
+#include "host/framework/time_refresh.h"
+#include "host/mgmtd/load_text.h"
+#include "host/modules/mode.h"
+#include "host/modules/node_access.h"
+#include "host/tree/name.h"
+
+#include <nlohmann/json.hpp>
+#include <unistd.h>
+
+#include <algorithm>
+
+namespace ovhost
+{
+namespace
+{
+
+using nlohmann::json;
+
+json value_json(const std::optional<Value> &value)
+{
+    return value ? json{{"type", type_name(value->type)}, {"value", value->text}} : json();
+}
+
+json change_json(const Change &change)
+{
+    const char *const kind = !change.before ? "add" : !change.after ? "delete" : "modify";
+    return {{"change", kind},
+            {"name", join_name(change.parts)},
+            {"old", value_json(change.before)},
+            {"new", value_json(change.after)}};
+}
+
+json warnings_json(const std::vector<Warning> &warnings)
+{
+    auto texts = json::array();
+    for (const Warning &warning : warnings) {
+        texts.push_back(warning.message);
+    }
+    return texts;
+}
+
+std::vector<std::string> required_name(const json &request)
+{
+    const std::string name = required_text(request, "name");
+    auto parts = split_name(name);
+    if (!parts) {
+        throw RequestError(error_code::bad_value,
+                           "\"" + name + "\" is not a node name: write it as /part/part");
+    }
+    return std::move(*parts);
+}
+
+/// The number of nodes that hold a value at or below a name.
+std::size_t count_values(const Tree &tree, Tree::Parts below)
+{
+    std::size_t count = 0;
+    tree.visit([&count](Tree::Parts, const Value &) { ++count; }, below);
+    return count;
+}
+
+[[noreturn]] void throw_refused(const char *what, const std::vector<Refusal> &refusals)
+{
+    std::vector<ErrorDetail> details;
+    details.reserve(refusals.size());
+    for (const Refusal &refusal : refusals) {
+        details.push_back({refusal.node, refusal.message, refusal.module, 0});
+    }
+    throw RequestError(error_code::refused, what, std::move(details));
+}
+
+json mode_json(const ModeAnswers &answers)
+{
+    return {{"mode", answers.mode ? json(*answers.mode) : json()},
+            {"submode", answers.submode},
+            {"bridge", answers.bridge},
+            {"router", answers.router},
+            {"server", answers.server},
+            {"inline_router", answers.inline_router},
+            {"router_interfaces", answers.router_interfaces},
+            {"ten_gigabit", answers.ten_gigabit},
+            {"bonding", answers.bonding}};
+}
+
+} // namespace
+
+struct Requests::Command {
+    const char *name;
+    json (Requests::*handler)(const json &);
+};
+
+const Requests::Command Requests::commands[] = {
+    {"get", &Requests::get},         {"set", &Requests::set},
+    {"delete", &Requests::erase},    {"load", &Requests::load},
+    {"discard", &Requests::discard}, {"diff", &Requests::diff_candidate},
+    {"check", &Requests::check},     {"commit", &Requests::commit},
+    {"status", &Requests::status},   {"show", &Requests::show},
+};
+
+Requests::Requests(Configuration &configuration, DaemonView daemon)
+    : configuration_(configuration), daemon_(std::move(daemon))
+{
+}
+
+json Requests::handle(const json &request, const ClientInfo &)
+{
+    const std::string name = required_text(request, "command");
+    const auto *const command =
+        std::find_if(std::begin(commands), std::end(commands),
+                     [&name](const Command &candidate) { return name == candidate.name; });
+    if (command == std::end(commands)) {
+        throw RequestError(error_code::unknown_command, "unknown command \"" + name + "\"");
+    }
+    refresh_time_info();
+    return (this->*command->handler)(request);
+}
+
+json Requests::get(const json &request)
+{
+    const auto name = required_name(request);
+    const std::string from = optional_text(request, "from", "running");
+    if (from != "running" && from != "candidate") {
+        throw RequestError(error_code::bad_request,
+                           R"(get: "from" must be "running" or "candidate")");
+    }
+    const Tree &tree =
+        from == "running" ? configuration_.running() : configuration_.candidate().tree();
+    if (!name.empty() && !tree.exists(name)) {
+        throw RequestError(error_code::not_found,
+                           "no node " + join_name(name) + " in the " + from + " configuration");
+    }
+    auto nodes = json::array();
+    const auto add = [&nodes](Tree::Parts node, const Value &value) {
+        nodes.push_back(
+            {{"name", join_name(node)}, {"type", type_name(value.type)}, {"value", value.text}});
+    };
+    if (optional_flag(request, "subtree")) {
+        tree.visit(add, name);
+    } else if (const Value *const value = tree.value(name)) {
+        add(name, *value);
+    }
+    return {{"nodes", std::move(nodes)}};
+}
+
+json Requests::set(const json &request)
+{
+    const std::string name = required_text(request, "name");
+    const std::string type_text = required_text(request, "type");
+    bn_type type = 0;
+    if (lc_string_to_enum(bn_type_map, type_text.c_str(), &type) != 0) {
+        throw RequestError(error_code::bad_value, name + ": unknown type \"" + type_text + "\"");
+    }
+    if (const auto fault =
+            configuration_.candidate().set(name, type, required_text(request, "value"))) {
+        throw RequestError(error_code::bad_value, *fault);
+    }
+    return json::object();
+}
+
+json Requests::erase(const json &request)
+{
+    const auto name = required_name(request);
+    Candidate &candidate = configuration_.candidate();
+    const std::size_t removed = count_values(candidate.tree(), name);
+    if (const auto fault = candidate.erase(join_name(name))) {
+        throw RequestError(error_code::not_found, *fault);
+    }
+    return {{"removed", removed}};
+}
+
+json Requests::load(const json &request)
+{
+    const LoadResult result = load_text(configuration_.candidate(), required_text(request, "text"));
+    const std::string source = optional_text(request, "source", "text");
+    if (!result.faults.empty()) {
+        std::vector<ErrorDetail> details;
+        details.reserve(result.faults.size());
+        for (const LineFault &fault : result.faults) {
+            details.push_back({fault.node, fault.message, "", fault.line});
+        }
+        throw RequestError(error_code::bad_lines,
+                           source + ": " + std::to_string(details.size()) +
+                               (details.size() == 1 ? " bad line" : " bad lines") +
+                               "; nothing was loaded",
+                           std::move(details));
+    }
+    log_host_line(ov_log_info, "mgmtd", "loaded " + source);
+    return {{"set", result.set}, {"removed", result.removed}};
+}
+
+json Requests::discard(const json &)
+{
+    const auto dropped = configuration_.candidate().pending(configuration_.running()).size();
+    configuration_.discard();
+    return {{"changes", dropped}};
+}
+
+json Requests::diff_candidate(const json &)
+{
+    auto changes = json::array();
+    for (const Change &change : configuration_.candidate().pending(configuration_.running())) {
+        changes.push_back(change_json(change));
+    }
+    return {{"changes", std::move(changes)}};
+}
+
+json Requests::check(const json &)
+{
+    const CheckReport report = configuration_.check();
+    if (!report.accepted()) {
+        throw_refused("the candidate would be refused", report.refusals);
+    }
+    return {{"changes", report.changes.size()}, {"warnings", warnings_json(report.warnings)}};
+}
+
+json Requests::commit(const json &request)
+{
+    const std::string comment = optional_text(request, "comment");
+    daemon_.before_events();
+    const CommitReport report = configuration_.commit(comment);
+    if (report.outcome == CommitOutcome::not_stored) {
+        throw RequestError(error_code::internal, report.store_error);
+    }
+    if (!report.accepted()) {
+        throw_refused("the commit is refused", report.refusals);
+    }
+    const bool committed = report.outcome == CommitOutcome::committed;
+    return {{"number", configuration_.commit_number()},
+            {"changes", committed ? report.changes.size() : 0},
+            {"warnings", warnings_json(report.warnings)}};
+}
+
+json Requests::status(const json &)
+{
+    auto peers = json::array();
+    for (const PeerStatus &peer : daemon_.peers()) {
+        peers.push_back({{"name", peer.name},
+                         {"pid", peer.pid},
+                         {"events_sent", peer.events_sent},
+                         {"bytes_waiting", peer.bytes_waiting}});
+    }
+    const Candidate &candidate = configuration_.candidate();
+    const auto uptime = std::chrono::duration_cast<std::chrono::seconds>(
+        std::chrono::steady_clock::now() - started_);
+    return {
+        {"version", OVMD_VERSION},
+        {"pid", ::getpid()},
+        {"model", daemon_.model.empty() ? json() : json(daemon_.model)},
+        {"commit", configuration_.commit_number()},
+        {"nodes",
+         {{"running", configuration_.running().size()}, {"candidate", candidate.tree().size()}}},
+        {"candidate_changes", candidate.pending(configuration_.running()).size()},
+        {"peers", std::move(peers)},
+        {"uptime_seconds", uptime.count()}};
+}
+
+json Requests::show(const json &request)
+{
+    const std::string what = required_text(request, "what");
+    if (what == "mode") {
+        return mode_json(ask_mode(configuration_.running_db()));
+    }
+    throw RequestError(error_code::unknown_command, "show: there is no \"" + what + "\" to show");
+}
+
+} // namespace ovhost

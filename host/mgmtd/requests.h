@@ -1,0 +1,55 @@
+#pragma once
+// What clients can ask of the daemon: one handler for each command of docs/control-protocol.md.
+// control/server.h brings the requests; configuration.h is what they are about.
+
+#include "host/control/request_handler.h"
+#include "host/mgmtd/configuration.h"
+
+#include <nlohmann/json_fwd.hpp>
+
+#include <functional>
+#include <string>
+#include <vector>
+
+namespace ovhost
+{
+
+struct PeerStatus;
+
+/// What the handlers need to know of the daemon around them.
+struct DaemonView {
+    std::string model; ///< empty when none was named
+    std::function<std::vector<PeerStatus>()> peers;
+    /// Called before anything that may send events.
+    std::function<void()> before_events;
+};
+
+class Requests : public RequestHandler
+{
+  public:
+    Requests(Configuration &configuration, DaemonView daemon);
+
+    [[nodiscard]] nlohmann::json handle(const nlohmann::json &request,
+                                        const ClientInfo &client) override;
+
+  private:
+    struct Command;
+    static const Command commands[];
+
+    nlohmann::json get(const nlohmann::json &request);
+    nlohmann::json set(const nlohmann::json &request);
+    nlohmann::json erase(const nlohmann::json &request);
+    nlohmann::json load(const nlohmann::json &request);
+    nlohmann::json discard(const nlohmann::json &request);
+    nlohmann::json diff_candidate(const nlohmann::json &request);
+    nlohmann::json check(const nlohmann::json &request);
+    nlohmann::json commit(const nlohmann::json &request);
+    nlohmann::json status(const nlohmann::json &request);
+    nlohmann::json show(const nlohmann::json &request);
+
+    Configuration &configuration_;
+    DaemonView daemon_;
+    std::chrono::steady_clock::time_point started_ = std::chrono::steady_clock::now();
+};
+
+} // namespace ovhost

@@ -1,0 +1,41 @@
+#include "host/modules/change_events.h"
+
+#include "host/modules/node_access.h"
+#include "orvale/md_event_common.h"
+
+namespace ovhost
+{
+namespace
+{
+
+void announce(const mdb_db_change &change)
+{
+    const char *const name = ts_str(change.mdc_name);
+    const TstringPtr before = attribute_text(change.mdc_old_attribs);
+    const TstringPtr after = attribute_text(change.mdc_new_attribs);
+    switch (change.mdc_change_type) {
+    case mdct_add:
+        md_send_dbc_event2("add", name, ts_str(after.get()), nullptr);
+        break;
+    case mdct_delete:
+        md_send_dbc_event2("delete", name, nullptr, ts_str(before.get()));
+        break;
+    default:
+        md_send_dbc_event(name, ts_str(after.get()), ts_str(before.get()));
+    }
+}
+
+} // namespace
+
+void ChangeEventsModule::notify(const mdb_db_change_array *changes)
+{
+    const auto count = static_cast<uint32>(mdb_db_change_array_length_quick(changes));
+    for (uint32 i = 0; i < count; ++i) {
+        const mdb_db_change *const change = mdb_db_change_array_get_quick(changes, i);
+        if (change != nullptr && !change->mdc_no_notify) {
+            announce(*change);
+        }
+    }
+}
+
+} // namespace ovhost

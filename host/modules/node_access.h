@@ -1,0 +1,37 @@
+#pragma once
+// What modules need of nodes: the operations of framework/ with owners around what they hand out.
+
+#include "framework/mdb_db.h"
+
+#include <cstdlib>
+#include <memory>
+#include <string>
+
+namespace ovhost
+{
+
+struct TstringDeleter {
+    void operator()(tstring *text) const { ts_free(&text); }
+};
+using TstringPtr = std::unique_ptr<tstring, TstringDeleter>;
+
+struct BindingDeleter {
+    void operator()(bn_binding *binding) const { bn_binding_free(&binding); }
+};
+using BindingPtr = std::unique_ptr<bn_binding, BindingDeleter>;
+
+struct TextDeleter {
+    void operator()(char *text) const { std::free(text); }
+};
+using TextPtr = std::unique_ptr<char, TextDeleter>;
+
+/// The value among a change's attributes; null when there is none.
+[[nodiscard]] TstringPtr attribute_text(const bn_attrib_array *attribs);
+
+/// A node; null when it is absent or cannot be read.
+[[nodiscard]] BindingPtr node_binding(const mdb_db *db, const char *name);
+
+/// The name of a type ("uint32"); its number when it has none.
+[[nodiscard]] std::string type_name(bn_type type);
+
+} // namespace ovhost
