@@ -21,8 +21,8 @@ bool has_several_children(const TreeNode &node)
     return node.children && (node.children->left || node.children->right);
 }
 
-/// Of the parents on the way to `name` those at the end that would be left without value and child;
-/// so this is the name to remove. Nothing when there is no node of that name.
+/// What goes when the node `name` goes: the node itself or, of the parents that would be left
+/// without value and child, the highest. Nothing when there is no such node.
 std::optional<Parts> name_to_remove(const TreeNode *root, Parts name)
 {
     std::size_t kept = 0;

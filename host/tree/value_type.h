@@ -30,9 +30,8 @@
 // binary                       pairs of hex digits, or nothing
 // oid                          2 to 128 numbers, each a uint32, joined by "."; may start with a "."
 // link name                    a node name (name.h)
-// hostname                     labels of letters, digits and inner "-", 1 to 63 long, joined by
-// ".",
-//                              253 at most in all
+// hostname                     labels of letters, digits and inner "-", 1 to 63 long, with dots
+//                              between them, 253 at most in all
 // uri                          scheme ":" and what may stand in a URI: no blanks, no raw non-ASCII,
 //                              "%" only before two hex digits, at most one "#"
 // regex                        a POSIX extended regular expression, of at most 1,024 bytes, whose
