@@ -207,7 +207,7 @@ void check_no_orphaned_log(const fs::path &file)
 void create_database(const fs::path &file)
 {
     check_no_orphaned_log(file);
-    const fs::path unfinished = file;
+    const fs::path unfinished = file.string() + ".new";
     for (const char *side : {"", "-wal", "-journal"})
         remove_file(unfinished.string() + side);
     write_new_database(unfinished);
