@@ -30,16 +30,17 @@ char *copy_field(const ov_defdb_field &source)
     return text;
 }
 
-// The code of a type name. `ret_name` receives the name as text when the host was asked for it.
-int look_up_type(type_memo &memo, const ov_defdb_field &name, bn_type &ret_type,
-                 owned_text &ret_name)
+// The code of a type name, on behalf of `function`, which the error lines name. `ret_name` receives
+// the name as text when the host was asked for it.
+int look_up_type(const char *function, type_memo &memo, const ov_defdb_field &name,
+                 bn_type &ret_type, owned_text &ret_name)
 {
     if (memo.find(name, ret_type)) {
         return 0;
     }
     *ret_name.out() = copy_field(name);
     if (ret_name.get() == nullptr) {
-        return lc_err_unexpected_null;
+        return bail_report_null(function, bail_unit, __LINE__);
     }
     const int err = lc_string_to_enum(bn_type_map, ret_name.get(), &ret_type);
     if (err == 0) {
@@ -48,14 +49,15 @@ int look_up_type(type_memo &memo, const ov_defdb_field &name, bn_type &ret_type,
     return err;
 }
 
-// Fills an entry; `value` null means that the entry has none. On failure nothing stays allocated.
-int make_entry(const ov_defdb_field &name, bn_type type, const ov_defdb_field *value,
-               bn_str_value &ret_entry)
+// Fills an entry, on behalf of `function` likewise; `value` null means that the entry has none. On
+// failure nothing stays allocated.
+int make_entry(const char *function, const ov_defdb_field &name, bn_type type,
+               const ov_defdb_field *value, bn_str_value &ret_entry)
 {
     bn_str_value entry = {copy_field(name), type, value != nullptr ? copy_field(*value) : nullptr};
     if (entry.bv_name == nullptr || (value != nullptr && entry.bv_value == nullptr)) {
         free_entry_texts(entry);
-        return lc_err_unexpected_null;
+        return bail_report_null(function, bail_unit, __LINE__);
     }
     ret_entry = entry;
     return 0;
@@ -69,14 +71,14 @@ int convert_line_to_bn_str_value(const char *line, type_memo &memo, bn_str_value
     }
     bn_type type = 0;
     owned_text type_name;
-    const int err = look_up_type(memo, fields.type, type, type_name);
+    const int err = look_up_type(__func__, memo, fields.type, type, type_name);
     if (err != 0) {
         if (type_name.get() != nullptr) {
             BAIL_LOG("Unable to convert %s type", type_name.get());
         }
         return err;
     }
-    return make_entry(fields.name, type, &fields.value, ret_entry);
+    return make_entry(__func__, fields.name, type, &fields.value, ret_entry);
 }
 
 // A removal needs its name alone. Without a type a value says nothing and is dropped.
@@ -87,16 +89,16 @@ int convert_removal(const char *line, type_memo &memo, bn_str_value &ret_entry)
         return lc_err_parse_error;
     }
     if (fields.type.length == 0) {
-        return make_entry(fields.name, 0, nullptr, ret_entry);
+        return make_entry(__func__, fields.name, 0, nullptr, ret_entry);
     }
     bn_type type = 0;
     owned_text type_name;
-    const int err = look_up_type(memo, fields.type, type, type_name);
+    const int err = look_up_type(__func__, memo, fields.type, type, type_name);
     if (err != 0) {
         return err;
     }
-    return make_entry(fields.name, type, fields.value.length == 0 ? nullptr : &fields.value,
-                      ret_entry);
+    return make_entry(__func__, fields.name, type,
+                      fields.value.length == 0 ? nullptr : &fields.value, ret_entry);
 }
 
 line_counts count_lines(const tstr_array *lines, uint32 num_lines)
