@@ -1,0 +1,210 @@
+#include "framework/files.h"
+
+#include "tests/framework/allocation_failure.h"
+#include "tests/framework/log_capture.h"
+#include "tests/framework/owned.h"
+
+#include <sys/stat.h>
+#include <unistd.h>
+
+#include <gmock/gmock.h>
+#include <gtest/gtest.h>
+
+#include <filesystem>
+#include <fstream>
+#include <string>
+#include <thread>
+
+namespace ovhost::test
+{
+namespace
+{
+
+using testing::ElementsAre;
+using testing::HasSubstr;
+using testing::IsEmpty;
+
+class Files : public testing::Test
+{
+  protected:
+    Files()
+    {
+        std::string pattern = testing::TempDir() + "files_test.XXXXXX";
+        dir = ::mkdtemp(pattern.data());
+    }
+    ~Files() override { std::filesystem::remove_all(dir); }
+
+    [[nodiscard]] std::string path(const char *name) const { return (dir / name).string(); }
+
+    std::string write(const char *name, std::string_view content) const
+    {
+        std::ofstream(path(name), std::ios::binary) << content;
+        return path(name);
+    }
+
+    std::vector<std::string> lines_of(std::string_view content) const
+    {
+        OwnedStrings lines;
+        EXPECT_EQ(lf_read_file_lines(write("lines", content).c_str(), lines.out()), 0);
+        return texts_of(lines);
+    }
+
+    std::filesystem::path dir;
+};
+
+TEST_F(Files, ExistsTellsWhatIsThere)
+{
+    tbool exists = false;
+    EXPECT_EQ(lf_test_exists(write("there", "").c_str(), &exists), 0);
+    EXPECT_TRUE(exists);
+    exists = false;
+    EXPECT_EQ(lf_test_exists(dir.c_str(), &exists), 0);
+    EXPECT_TRUE(exists);
+}
+
+TEST_F(Files, ExistsTellsWhatIsNot)
+{
+    std::filesystem::create_symlink(path("nowhere"), path("dangling"));
+    write("file", "");
+    for (const char *name : {"none", "none/deeper", "file/below", "dangling"}) {
+        tbool exists = true;
+        EXPECT_EQ(lf_test_exists(path(name).c_str(), &exists), 0) << name;
+        EXPECT_FALSE(exists) << name;
+    }
+}
+
+TEST_F(Files, ExistsSaysWhenItCannotBeTold)
+{
+    std::filesystem::create_symlink("loop", path("loop"));
+    tbool exists = true;
+    EXPECT_EQ(lf_test_exists(path("loop").c_str(), &exists), 14014);
+    EXPECT_TRUE(exists);
+    EXPECT_EQ(lf_test_exists(nullptr, &exists), 14001);
+    EXPECT_EQ(lf_test_exists("/", nullptr), 14001);
+}
+
+TEST_F(Files, LinesLoseTheirEnds)
+{
+    EXPECT_THAT(lines_of("one\ntwo\n\nfour\n"), ElementsAre("one", "two", "", "four"));
+}
+
+TEST_F(Files, TheLastLineNeedsNoEnd)
+{
+    EXPECT_THAT(lines_of("one\ntwo"), ElementsAre("one", "two"));
+    EXPECT_THAT(lines_of("one"), ElementsAre("one"));
+}
+
+TEST_F(Files, AnEmptyFileHasNoLines)
+{
+    EXPECT_THAT(lines_of(""), IsEmpty());
+    EXPECT_THAT(lines_of("\n"), ElementsAre(""));
+}
+
+TEST_F(Files, ACarriageReturnIsPartOfTheLine)
+{
+    EXPECT_THAT(lines_of("one\r\ntwo\r"), ElementsAre("one\r", "two\r"));
+}
+
+TEST_F(Files, LinesMayBeLongerThanAnyBlock)
+{
+    const std::string first(3'000'000, 'a');
+    const std::string second(700'000, 'b');
+    EXPECT_THAT(lines_of(first + "\n" + second + "\nc"), ElementsAre(first, second, "c"));
+}
+
+TEST_F(Files, LinesAcrossBlockBordersComeOutWhole)
+{
+    // Lines of 1 to 97 bytes: every border between blocks falls somewhere else in a line.
+    std::string content;
+    std::vector<std::string> expected;
+    for (std::size_t number = 0; content.size() < 1'200'000; ++number) {
+        expected.push_back(std::string(number % 97, 'x') + std::to_string(number % 10));
+        content += expected.back() + "\n";
+    }
+    EXPECT_EQ(lines_of(content), expected);
+}
+
+TEST_F(Files, LinesCanComeFromAPipe)
+{
+    ASSERT_EQ(::mkfifo(path("pipe").c_str(), 0600), 0);
+    std::thread writer([this] { std::ofstream(path("pipe")) << "a\nb" << std::flush << "c\n"; });
+    OwnedStrings lines;
+    const int status = lf_read_file_lines(path("pipe").c_str(), lines.out());
+    writer.join();
+    ASSERT_EQ(status, 0);
+    EXPECT_THAT(texts_of(lines), ElementsAre("a", "bc"));
+}
+
+TEST_F(Files, ReadSaysWhatFailed)
+{
+    OwnedStrings lines;
+    EXPECT_EQ(lf_read_file_lines(path("none").c_str(), lines.out()), 14013);
+    EXPECT_EQ(lf_read_file_lines(path("none/deeper").c_str(), lines.out()), 14013);
+    EXPECT_EQ(lf_read_file_lines(dir.c_str(), lines.out()), 14014);
+    std::filesystem::create_symlink("loop", path("loop"));
+    EXPECT_EQ(lf_read_file_lines(path("loop").c_str(), lines.out()), 14014);
+    EXPECT_EQ(lf_read_file_lines(nullptr, lines.out()), 14001);
+    EXPECT_EQ(lf_read_file_lines("/", nullptr), 14001);
+    EXPECT_EQ(lines.get(), nullptr);
+}
+
+TEST_F(Files, ReadReportsLackOfMemory)
+{
+    const std::string file = write("lines", std::string(100, 'a') + "\n" + std::string(100, 'b'));
+    OwnedStrings lines;
+    expect_allocation_failures_reported(
+        [&] { return lf_read_file_lines(file.c_str(), lines.out()); });
+    EXPECT_EQ(tstr_array_length_quick(lines.get()), 2);
+}
+
+TEST_F(Files, AConfigurationFileMayBeUsed)
+{
+    LogCapture log;
+    EXPECT_TRUE(conf_file_okay(write("conf", "x").c_str()));
+    std::filesystem::create_symlink("conf", path("link"));
+    EXPECT_TRUE(conf_file_okay(path("link").c_str()));
+    EXPECT_THAT(log.lines, IsEmpty());
+}
+
+TEST_F(Files, AConfigurationFileThatMayNotBeUsedIsSaidWhy)
+{
+    using std::filesystem::perms;
+    write("open", "x");
+    std::filesystem::permissions(path("open"), perms::owner_read | perms::others_write);
+    ASSERT_EQ(::mkfifo(path("pipe").c_str(), 0600), 0);
+    std::filesystem::create_directory(path("dir"));
+    const std::pair<const char *, const char *> refused[] = {
+        {"none", "No such file or directory"},
+        {"dir", "not a regular file"},
+        {"pipe", "not a regular file"},
+        {"open", "everybody may write to it"},
+    };
+    for (const auto &[name, reason] : refused) {
+        LogCapture log;
+        G_daemon_log_level = 5;
+        EXPECT_FALSE(conf_file_okay(path(name).c_str())) << name;
+        ASSERT_EQ(log.lines.size(), 1U) << name;
+        EXPECT_EQ(log.lines[0].level, 5);
+        EXPECT_THAT(log.lines[0].text, HasSubstr(path(name)));
+        EXPECT_THAT(log.lines[0].text, HasSubstr(reason));
+    }
+    EXPECT_FALSE(conf_file_okay(nullptr));
+}
+
+TEST_F(Files, AConfigurationFileThatMayNotBeReadIsRefused)
+{
+    if (::geteuid() == 0) {
+        // Everything is readable for root; a dangling link is refused on the same way out.
+        std::filesystem::create_symlink("nowhere", path("locked"));
+    } else {
+        write("locked", "x");
+        std::filesystem::permissions(path("locked"), std::filesystem::perms::none);
+    }
+    LogCapture log;
+    EXPECT_FALSE(conf_file_okay(path("locked").c_str()));
+    ASSERT_EQ(log.lines.size(), 1U);
+    EXPECT_THAT(log.lines[0].text, HasSubstr("cannot be opened"));
+}
+
+} // namespace
+} // namespace ovhost::test
