@@ -3,8 +3,6 @@
 #include "host/tree/name.h"
 #include "host/tree/value_type.h"
 
-#include <algorithm>
-#include <ranges>
 #include <utility>
 
 namespace ovhost
@@ -127,9 +125,9 @@ Tree Candidate::over(const Tree &running) const
     Tree result = running;
     const std::vector<Change> edits = diff(base_, tree_);
     // Backwards, children go before their parents, so that a parent is seldom left with any.
-    for (const Change &edit : std::views::reverse(edits)) {
-        if (!edit.after) {
-            clear_value(result, edit.parts);
+    for (auto edit = edits.rbegin(); edit != edits.rend(); ++edit) {
+        if (!edit->after) {
+            clear_value(result, edit->parts);
         }
     }
     for (const Change &edit : edits) {

@@ -51,8 +51,9 @@ class Module
 
     /// Phase "check", once for each change that concerns the module, parents before children. A
     /// change that a module has made in the new database is checked too, in the next round.
-    /// Refuses by md_commit_set_return_status_msg, by a code other than 0, or by an exception;
-    /// code 14120 refuses quietly, with the message "cancelled".
+    /// Refuses by md_commit_set_return_status_msg, whatever it returns then; by a code other than
+    /// 0; or by an exception, whose words are the message. Code 14120 refuses quietly, with the
+    /// message "cancelled".
     virtual int check_change(md_dbinfo *, mdb_db_change *) { return 0; }
 
     /// Phase "check", once per round in which a change concerned the module, after check_change:

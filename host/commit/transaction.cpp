@@ -78,7 +78,8 @@ void Transaction::collect_refusal(const std::string &module, const std::string &
         refusal.code = lc_err_generic_error;
         refusal.message = *result.exception;
     } else if (result.refusal) {
-        refusal.code = result.refusal->code;
+        // A refusal with the code for success is a refusal all the same.
+        refusal.code = result.refusal->code != 0 ? result.refusal->code : lc_err_generic_error;
         refusal.message = result.refusal->message;
     } else if (result.code == 0) {
         return;

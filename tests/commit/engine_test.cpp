@@ -187,6 +187,31 @@ TEST(CommitEngineTest, MessageCountsWhateverTheCheckReturns)
     }
 }
 
+TEST(CommitEngineTest, RefusalWithTheCodeForSuccessIsARefusal)
+{
+    ScriptedModule module("odd", {"/a"});
+    Bench bench({&module});
+    module.on_change = [](md_dbinfo *info, mdb_db_change *) {
+        return md_commit_set_return_status_msg(info->commit, 0, "no");
+    };
+    Candidate candidate = bench.candidate({{"/a", "1"}});
+    EXPECT_THAT(bench.engine.commit(candidate, "").refusals,
+                ElementsAre(Refusal{"/a", "odd", 14000, "no"}));
+}
+
+TEST(CommitEngineTest, ExceptionReplacesTheMessageOfItsCall)
+{
+    ScriptedModule module("rash", {"/a"});
+    Bench bench({&module});
+    module.on_change = [](md_dbinfo *info, mdb_db_change *) -> int {
+        EXPECT_EQ(refuse(info, "first words"), 0);
+        throw std::runtime_error("last words");
+    };
+    Candidate candidate = bench.candidate({{"/a", "1"}});
+    EXPECT_THAT(bench.engine.commit(candidate, "").refusals,
+                ElementsAre(Refusal{"/a", "rash", 14000, "last words"}));
+}
+
 struct SilentFailure {
     int code;
     const char *of_node;

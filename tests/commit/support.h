@@ -125,8 +125,9 @@ class TemporaryDirectory
     std::filesystem::path path_;
 };
 
-/// An engine over a store in memory.
+/// An engine over a store in memory. What it logs goes nowhere else.
 struct Bench {
+    LogCapture log;
     MemoryStore store;
     ovhost::CommitEngine engine{store};
 
