@@ -1,0 +1,26 @@
+#include "tests/library/fault_rows.h"
+
+namespace ovtest
+{
+
+std::vector<FaultRow> md_db_default_rows();
+std::vector<FaultRow> md_dyna_limits_rows();
+std::vector<FaultRow> md_event_common_rows();
+std::vector<FaultRow> md_tunneld_tunnel_common_rows();
+
+const std::vector<FaultRow> &fault_rows()
+{
+    static const std::vector<FaultRow> all = [] {
+        std::vector<FaultRow> rows;
+        for (const auto rows_of_unit : {md_db_default_rows, md_dyna_limits_rows,
+                                        md_event_common_rows, md_tunneld_tunnel_common_rows}) {
+            for (FaultRow &row : rows_of_unit()) {
+                rows.push_back(std::move(row));
+            }
+        }
+        return rows;
+    }();
+    return all;
+}
+
+} // namespace ovtest

@@ -1,0 +1,118 @@
+// The table of the fault loop: for every exported function at least one situation, what the call
+// answers when nothing fails, and what it answers and logs when one of the host operations that it
+// calls does. fault_loop_test.cpp runs it; fault_rows_UNIT.cpp has a unit's rows.
+//
+// A row says what the caller of the function sees, as text: its `call` puts status, out-parameters
+// and what is left of files into words. In an expected text "{code}" stands for the failing code.
+#pragma once
+
+#include "tests/support/fault_layer.h"
+#include "tests/support/host_fixture.h"
+
+#include <string>
+#include <vector>
+
+namespace ovtest
+{
+
+// A line that is expected in the log.
+struct ExpectedLine {
+    enum class Kind {
+        bail,       // the code by the bail rule
+        bail_text,  // a text of its own in place of the code's, by the bail rule
+        unexpected, // "Unexpected NULL"
+        error,      // an error line that is not itself an error exit
+        gated,      // ov_log_internal
+    };
+    Kind kind;
+    std::string unit;
+    std::string function;
+    std::string text = {};
+    int level = 0; // of a gated line
+    int code = 0;  // of a bail line; 0 means the failing code
+};
+
+// Makes the lines of one unit.
+class UnitLines
+{
+  public:
+    explicit UnitLines(std::string unit) : unit_(std::move(unit)) {}
+
+    ExpectedLine bail(const std::string &function, int code = 0) const
+    {
+        return {ExpectedLine::Kind::bail, unit_, function, {}, 0, code};
+    }
+    ExpectedLine bail_text(const std::string &function, const std::string &text) const
+    {
+        return {ExpectedLine::Kind::bail_text, unit_, function, text};
+    }
+    ExpectedLine unexpected_null(const std::string &function) const
+    {
+        return {ExpectedLine::Kind::unexpected, unit_, function};
+    }
+    ExpectedLine error(const std::string &function, const std::string &text) const
+    {
+        return {ExpectedLine::Kind::error, unit_, function, text};
+    }
+
+  private:
+    std::string unit_;
+};
+
+inline ExpectedLine gated(int level, const std::string &text)
+{
+    return {ExpectedLine::Kind::gated, {}, {}, text, level};
+}
+
+// What a call answers and logs.
+struct Outcome {
+    std::string answer;
+    std::vector<ExpectedLine> log = {};
+};
+
+// Which failures an outcome is about.
+struct When {
+    Operation operation;
+    unsigned call = any_call;
+    enum class Lasting { either, once, and_later } lasting = Lasting::either;
+    FaultWay way = FaultWay::fails;
+
+    static constexpr unsigned any_call = 0;
+};
+
+inline When fails(Operation operation, unsigned call = When::any_call)
+{
+    return {operation, call};
+}
+inline When fails_once(Operation operation, unsigned call = When::any_call)
+{
+    return {operation, call, When::Lasting::once};
+}
+inline When fails_from(Operation operation, unsigned call = When::any_call)
+{
+    return {operation, call, When::Lasting::and_later};
+}
+// The query succeeds and hands out null.
+inline When hands_out_nothing(Operation operation, unsigned call = When::any_call)
+{
+    return {operation, call, When::Lasting::either, FaultWay::without_object};
+}
+
+struct FailureRow {
+    When when;
+    Outcome outcome;
+};
+
+struct FaultRow {
+    std::string function;  // the exported function
+    std::string situation; // an identifier
+    void (*set_up)(HostFixture &);
+    std::string (*call)(HostFixture &);
+    Outcome without_fault;
+    std::vector<FailureRow> failures; // the first that fits counts
+};
+
+// All rows of all units.
+const std::vector<FaultRow> &fault_rows();
+
+} // namespace ovtest
