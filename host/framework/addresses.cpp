@@ -42,14 +42,16 @@ std::optional<Address> parse_address(const char *text)
 std::optional<unsigned> length_of_mask(const Address &mask)
 {
     unsigned length = 0;
+    unsigned bits_before = 0;
     for (const std::uint8_t byte : mask.bytes) {
         const auto ones = static_cast<unsigned>(std::countl_one(byte));
         const bool is_contiguous = static_cast<std::uint8_t>(byte << ones) == 0;
-        const bool is_below_a_zero = byte != 0 && length % 8 != 0;
+        const bool is_below_a_zero = byte != 0 && length != bits_before;
         if (!is_contiguous || is_below_a_zero) {
             return std::nullopt;
         }
         length += ones;
+        bits_before += 8;
     }
     return length;
 }

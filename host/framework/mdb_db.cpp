@@ -109,8 +109,13 @@ int mdb_get_node_binding(md_commit * /*commit*/, const mdb_db *db, const char *n
 {
     return query(db, name, ret, [&](Tree::Parts parts) -> int {
         const Value *value = db->tree.value(parts);
-        return value == nullptr ? lc_err_no_error
-                                : hand_out(ret, bn_binding{name, {{{ba_value, *value}}}});
+        if (value == nullptr) {
+            return lc_err_no_error;
+        }
+        bn_binding binding;
+        binding.name = name;
+        binding.attribs.attribs.emplace(ba_value, *value);
+        return hand_out(ret, std::move(binding));
     });
 }
 

@@ -4,6 +4,7 @@
 #include "host/framework/objects.h"
 
 #include <algorithm>
+#include <utility>
 #include <vector>
 
 namespace
@@ -87,8 +88,8 @@ int uint32_array_insert_sorted(uint32_array *arr, uint32 value)
     if (arr->options.ao_elem_compare_func == nullptr) {
         return lc_err_assertion_failed;
     }
-    const auto [first_equal, behind_equal] = find_equal(*arr, value);
-    const bool is_duplicate = first_equal != behind_equal;
+    const std::pair<Position, Position> equal = find_equal(*arr, value);
+    const bool is_duplicate = equal.first != equal.second;
     if (is_duplicate && arr->options.ao_dup_policy == adp_delete_new) {
         return lc_err_no_error;
     }
@@ -97,11 +98,11 @@ int uint32_array_insert_sorted(uint32_array *arr, uint32 value)
         return status;
     }
     if (is_duplicate && arr->options.ao_dup_policy == adp_delete_old) {
-        *first_equal = stored;
+        *equal.first = stored;
         return lc_err_no_error;
     }
     return at_c_boundary([&]() -> int {
-        arr->elements.insert(behind_equal, stored);
+        arr->elements.insert(equal.second, stored);
         return lc_err_no_error;
     });
 }

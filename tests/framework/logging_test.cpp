@@ -9,6 +9,7 @@
 
 #include <chrono>
 #include <string>
+#include <string_view>
 #include <vector>
 
 namespace ovhost::test
@@ -19,6 +20,7 @@ namespace
 using testing::ElementsAre;
 using testing::IsEmpty;
 using testing::MatchesRegex;
+using namespace std::string_view_literals;
 
 LogRecord sample_record()
 {
@@ -58,7 +60,7 @@ TEST(LogLine, MarksWhatTheCallerDoesNotName)
 TEST(LogLine, StaysOneLineWhateverTheTextHolds)
 {
     LogRecord record = sample_record();
-    record.text = std::string_view("a\nb\tc\r\x1b[0m\x7f\0.\xC3\xA9", 17);
+    record.text = "a\nb\tc\r\x1b[0m\x7f\0.\xC3\xA9"sv;
     EXPECT_EQ(format_log_line(record),
               "2026-02-03T04:05:06.789Z error md_db_default:57 db_default_get_all: "
               "a\\nb\\tc\\x0d\\x1b[0m\\x7f\\x00.\xC3\xA9\n");
