@@ -6,6 +6,8 @@
 #include <sqlite3.h>
 #include <sys/stat.h>
 
+#include <fstream>
+
 #include "host/store/store.h"
 #include "tests/store/child.h"
 #include "tests/store/scratch_dir.h"
@@ -28,6 +30,14 @@ using ovtest::write_file;
 using testing::StartsWith;
 
 constexpr std::size_t kPage = 4096;
+
+// Changes the bytes of a file that stays in use.
+void overwrite(const fs::path &file, const std::string &bytes)
+{
+    std::fstream open_file(file, std::ios::binary | std::ios::in | std::ios::out);
+    open_file << bytes;
+    ASSERT_TRUE(open_file.flush());
+}
 
 class StoreDamage : public testing::Test
 {
@@ -290,6 +300,29 @@ TEST_F(StoreDamage, WhatACrashLeftOfANewDatabaseIsNoHindrance)
     EXPECT_TRUE(Store::open(scratch_.path()).empty());
     EXPECT_FALSE(fs::exists(scratch_ / "config.db.new"));
     EXPECT_FALSE(fs::exists(scratch_ / "config.db.new-wal"));
+}
+
+// SQLite leaves the transaction open after this failure, unlike after those of the disk.
+TEST_F(StoreDamage, APageFoundDamagedInACommitLeavesTheStoreAsItWas)
+{
+    ovtest::Nodes before;
+    {
+        Store store = Store::open(scratch_.path());
+        store.commit(numbered(20'000, std::string(200, 'x'))); // more than SQLite keeps in memory
+        before = nodes_of(store);
+    }
+    {
+        Store store = Store::open(scratch_.path());
+        const std::string whole = read_file(file_);
+        overwrite(file_, whole.substr(0, kPage) + std::string(whole.size() - kPage, '\xa5'));
+        EXPECT_THROW(store.commit(numbered(20'000, "y")), ovhost::StoreError);
+        // The commit number's page is in memory since the start.
+        EXPECT_EQ(store.commit({}), 2U);
+        overwrite(file_, whole);
+    }
+    const Store store = Store::open(scratch_.path());
+    EXPECT_EQ(nodes_of(store), before);
+    EXPECT_EQ(store.commit_number(), 2U);
 }
 
 TEST_F(StoreDamage, ARefusalLetsTheDirectoryGo)
