@@ -61,7 +61,7 @@ void Connection::on_readable(int, short, void *connection)
 void Connection::on_writable(int, short what, void *connection)
 {
     static_cast<Connection *>(connection)
-        ->guarded((what & EV_TIMEOUT) != 0 ? &Connection::check_stall : &Connection::write_output);
+        ->guarded((what & EV_WRITE) != 0 ? &Connection::write_output : &Connection::check_stall);
 }
 
 /// The event loop is C code: an exception ends the connection it came from, not the daemon.
@@ -200,6 +200,9 @@ void Connection::await_writable()
     if (event_pending(write_event_.get(), EV_WRITE, nullptr) != 0)
         return;
     progress_ = false;
+    // The loop's clock stands still while a request is handled: without this the patience would
+    // begin before the answer was there.
+    event_base_update_cache_time(event_get_base(write_event_.get()));
     const timeval patience = to_timeval(limits_.stall_timeout);
     event_add(write_event_.get(), &patience);
 }

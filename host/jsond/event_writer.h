@@ -2,7 +2,7 @@
 // Writes events to a file, a pipe or a terminal, one JSON line each. peer.h is where they come
 // from.
 
-#include "host/control/unique_fd.h"
+#include "host/support/unique_fd.h"
 
 #include <nlohmann/json_fwd.hpp>
 

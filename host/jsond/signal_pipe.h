@@ -1,7 +1,7 @@
 #pragma once
 // Turns SIGTERM and SIGINT into a readable descriptor, so that every wait of jsond can end by them.
 
-#include "host/control/unique_fd.h"
+#include "host/support/unique_fd.h"
 
 namespace ovhost
 {

@@ -1,6 +1,6 @@
 #include "host/ovctl/text_input.h"
 
-#include "host/control/unique_fd.h"
+#include "host/support/unique_fd.h"
 
 #include <fcntl.h>
 
