@@ -1,0 +1,431 @@
+// The client as its users see it: command lines, texts to the byte, exit codes. host/ovctl/.
+
+#include "tests/control/process.h"
+#include "tests/control/temp_dir.h"
+#include "tests/control/test_server.h"
+
+#include <gtest/gtest.h>
+
+#include <optional>
+#include <ostream>
+#include <string>
+#include <vector>
+
+namespace ovhost
+{
+namespace
+{
+
+using nlohmann::json;
+using test::Process;
+using test::TempDir;
+using test::TestServer;
+
+struct Outcome {
+    int exit;
+    std::string out;
+    std::string err;
+
+    bool operator==(const Outcome &) const = default;
+};
+
+void PrintTo(const Outcome &outcome, std::ostream *stream)
+{
+    *stream << "exit " << outcome.exit << "\nout: " << outcome.out << "\nerr: " << outcome.err;
+}
+
+Outcome run(const std::vector<std::string> &words, const std::string &input = {},
+            const std::vector<std::string> &environment = {})
+{
+    std::vector<std::string> argv{OVMD_OVCTL};
+    argv.insert(argv.end(), words.begin(), words.end());
+    Process process(argv, input, environment);
+    const int exit = process.wait();
+    return {exit, process.out(), process.err()};
+}
+
+/// A daemon that gives one answer and keeps the request.
+class OvctlTest : public testing::Test
+{
+  protected:
+    Outcome ask(const std::vector<std::string> &words, const std::string &input = {})
+    {
+        std::vector<std::string> all{"--socket", server_.path()};
+        all.insert(all.end(), words.begin(), words.end());
+        return run(all, input);
+    }
+
+    /// The request as it arrived, without its id.
+    json request()
+    {
+        json copy = request_;
+        copy.erase("id");
+        return copy;
+    }
+
+    void answer_with(json result) { result_ = std::move(result); }
+
+    void refuse_with(const RequestError &error) { refusal_ = error; }
+
+    std::string path() const { return server_.path(); }
+
+  private:
+    json handle(const json &request)
+    {
+        request_ = request;
+        if (refusal_)
+            throw RequestError(*refusal_);
+        return result_;
+    }
+
+    json request_ = json::object();
+    json result_ = json::object();
+    std::optional<RequestError> refusal_;
+    TestServer server_{
+        [this](const json &request, const ClientInfo &) -> json { return handle(request); }};
+};
+
+TEST_F(OvctlTest, GetPrintsNodes)
+{
+    answer_with({{"nodes",
+                  {{{"name", "/a"}, {"type", "uint32"}, {"value", "5"}},
+                   {{"name", "/a/b\\/c"}, {"type", "string"}, {"value", "two words"}},
+                   {{"name", "/a/d"}, {"type", "string"}, {"value", ""}}}}});
+    EXPECT_EQ(ask({"get", "/a", "--subtree"}),
+              (Outcome{0, "/a uint32 5\n/a/b\\/c string two words\n/a/d string \n", ""}));
+    EXPECT_EQ(request(),
+              (json{{"command", "get"}, {"name", "/a"}, {"subtree", true}, {"from", "running"}}));
+    ask({"get", "/a", "--candidate"});
+    EXPECT_EQ(
+        request(),
+        (json{{"command", "get"}, {"name", "/a"}, {"subtree", false}, {"from", "candidate"}}));
+}
+
+TEST_F(OvctlTest, AValueStaysOnItsLine)
+{
+    answer_with(
+        {{"nodes", {{{"name", "/a"}, {"type", "string"}, {"value", "x\ny\t\x1b[31m\x7f\r"}}}}});
+    EXPECT_EQ(ask({"get", "/a"}), (Outcome{0, "/a string x\\ny\\t\\x1b[31m\\x7f\\r\n", ""}));
+}
+
+TEST_F(OvctlTest, SetSendsNameTypeAndValue)
+{
+    EXPECT_EQ(ask({"set", "/a", "string", "v w"}), (Outcome{0, "", ""}));
+    EXPECT_EQ(request(),
+              (json{{"command", "set"}, {"name", "/a"}, {"type", "string"}, {"value", "v w"}}));
+}
+
+TEST_F(OvctlTest, ValuesOfAllKindsArriveAsTheyAre)
+{
+    for (const char *value : {"", "-5", "[a,b]", "{}", "\"quoted\"", "a=b", "%s", "caf\xc3\xa9"}) {
+        EXPECT_EQ(ask({"set", "/a", "string", value}), (Outcome{0, "", ""})) << value;
+        EXPECT_EQ(request().value("value", "none"), value);
+    }
+    EXPECT_EQ(ask({"set", "--", "/a", "string", "--json"}), (Outcome{0, "", ""}));
+    EXPECT_EQ(request().value("value", "none"), "--json");
+}
+
+TEST_F(OvctlTest, AValueThatIsNotUtf8IsNotSent)
+{
+    EXPECT_EQ(ask({"set", "/a", "string", "caf\xe9"}),
+              (Outcome{2, "", "ovctl: VALUE is not UTF-8 in line 1: convert it first\n"}));
+    EXPECT_TRUE(request().empty());
+}
+
+TEST_F(OvctlTest, DeleteSendsTheName)
+{
+    answer_with({{"removed", 2}});
+    EXPECT_EQ(ask({"delete", "/a"}), (Outcome{0, "", ""}));
+    EXPECT_EQ(request(), (json{{"command", "delete"}, {"name", "/a"}}));
+}
+
+TEST_F(OvctlTest, LoadSendsAFile)
+{
+    const TempDir dir;
+    const std::string text = "# comment\n/a,uint32,5\n-/b\n";
+    test::write_file(dir.path("site.db"), text);
+    answer_with({{"set", 1}, {"removed", 2}});
+    EXPECT_EQ(ask({"load", dir.path("site.db")}),
+              (Outcome{0, "loaded 1 value and 2 removals\n", ""}));
+    EXPECT_EQ(request(),
+              (json{{"command", "load"}, {"text", text}, {"source", dir.path("site.db")}}));
+}
+
+TEST_F(OvctlTest, LoadReadsStandardInput)
+{
+    answer_with({{"set", 2}, {"removed", 1}});
+    EXPECT_EQ(ask({"load", "-"}, "/a,uint32,5\n"),
+              (Outcome{0, "loaded 2 values and 1 removal\n", ""}));
+    EXPECT_EQ(request(),
+              (json{{"command", "load"}, {"text", "/a,uint32,5\n"}, {"source", "standard input"}}));
+}
+
+TEST_F(OvctlTest, AFileThatCannotBeReadIsNamed)
+{
+    EXPECT_EQ(ask({"load", "/nowhere/site.db"}),
+              (Outcome{2, "", "ovctl: cannot read /nowhere/site.db: No such file or directory\n"}));
+    EXPECT_EQ(ask({"load", "/"}), (Outcome{2, "", "ovctl: cannot read /: Is a directory\n"}));
+    EXPECT_TRUE(request().empty());
+}
+
+TEST_F(OvctlTest, CheckSaysWhatACommitWouldDo)
+{
+    answer_with({{"changes", 1}, {"warnings", {"mode changes"}}});
+    EXPECT_EQ(ask({"check"}),
+              (Outcome{0, "warning: mode changes\na commit would make 1 change\n", ""}));
+    EXPECT_EQ(request(), (json{{"command", "check"}}));
+}
+
+TEST_F(OvctlTest, CommitSaysItsNumber)
+{
+    answer_with({{"number", 7}, {"changes", 2}, {"warnings", json::array()}});
+    EXPECT_EQ(ask({"commit"}), (Outcome{0, "commit 7: 2 changes\n", ""}));
+    EXPECT_EQ(request(), (json{{"command", "commit"}}));
+    EXPECT_EQ(ask({"commit", "--comment", "new site"}).exit, 0);
+    EXPECT_EQ(request(), (json{{"command", "commit"}, {"comment", "new site"}}));
+}
+
+TEST_F(OvctlTest, CommitOfNothing)
+{
+    answer_with({{"number", 7}, {"changes", 0}, {"warnings", json::array()}});
+    EXPECT_EQ(ask({"commit"}), (Outcome{0, "nothing to commit\n", ""}));
+}
+
+TEST_F(OvctlTest, DiffPrintsAChangePerLine)
+{
+    const auto node = [](const char *type, const char *value) {
+        return json{{"type", type}, {"value", value}};
+    };
+    answer_with(
+        {{"changes",
+          {{{"change", "add"}, {"name", "/a"}, {"old", nullptr}, {"new", node("uint32", "5")}},
+           {{"change", "delete"}, {"name", "/b"}, {"old", node("bool", "true")}, {"new", nullptr}},
+           {{"change", "modify"},
+            {"name", "/c"},
+            {"old", node("string", "x")},
+            {"new", node("string", "y z")}},
+           {{"change", "modify"},
+            {"name", "/d"},
+            {"old", node("string", "5")},
+            {"new", node("uint32", "5")}}}}});
+    EXPECT_EQ(ask({"diff"}), (Outcome{0,
+                                      "+ /a uint32 5\n"
+                                      "- /b bool true\n"
+                                      "~ /c: x -> y z\n"
+                                      "~ /d: string 5 -> uint32 5\n",
+                                      ""}));
+}
+
+TEST_F(OvctlTest, DiffOfNothingIsEmpty)
+{
+    answer_with({{"changes", json::array()}});
+    EXPECT_EQ(ask({"diff"}), (Outcome{0, "", ""}));
+}
+
+TEST_F(OvctlTest, DiscardSaysHowMuchIsGone)
+{
+    answer_with({{"changes", 3}});
+    EXPECT_EQ(ask({"discard"}), (Outcome{0, "discarded 3 changes\n", ""}));
+}
+
+TEST_F(OvctlTest, StatusPrintsTheFacts)
+{
+    answer_with({{"version", "1.0.0"},
+                 {"pid", 4711},
+                 {"uptime_seconds", 93784},
+                 {"model", "m1"},
+                 {"commit", 7},
+                 {"nodes", {{"running", 100}, {"candidate", 101}}},
+                 {"candidate_changes", 1},
+                 {"peers",
+                  {{{"name", "jsond"}, {"pid", 12}, {"events_sent", 1}, {"bytes_waiting", 0}},
+                   {{"name", "other"}, {"pid", 13}, {"events_sent", 2}, {"bytes_waiting", 600}}}}});
+    EXPECT_EQ(ask({"status"}), (Outcome{0,
+                                        "version             1.0.0\n"
+                                        "pid                 4711\n"
+                                        "uptime              1d 02:03:04\n"
+                                        "model               m1\n"
+                                        "last commit         7\n"
+                                        "running nodes       100\n"
+                                        "candidate nodes     101\n"
+                                        "candidate changes   1\n"
+                                        "peer                jsond (pid 12, 1 event sent)\n"
+                                        "peer                other (pid 13, 2 events sent, 600 "
+                                        "bytes waiting)\n",
+                                        ""}));
+}
+
+TEST_F(OvctlTest, StatusOfADaemonWithLittle)
+{
+    answer_with({{"version", "1.0.0"},
+                 {"pid", 1},
+                 {"uptime_seconds", 59},
+                 {"model", nullptr},
+                 {"commit", 0},
+                 {"nodes", {{"running", 0}, {"candidate", 0}}},
+                 {"candidate_changes", 0},
+                 {"peers", json::array()}});
+    const Outcome outcome = ask({"status"});
+    EXPECT_EQ(outcome.exit, 0);
+    EXPECT_NE(outcome.out.find("uptime              00:00:59\n"
+                               "model               none\n"),
+              std::string::npos)
+        << outcome.out;
+    EXPECT_EQ(outcome.out.find("peer"), std::string::npos);
+}
+
+TEST_F(OvctlTest, ShowModePrintsTheAnswers)
+{
+    answer_with({{"mode", "router"},
+                 {"submode", "normal"},
+                 {"bridge", false},
+                 {"router", true},
+                 {"server", false},
+                 {"inline_router", true},
+                 {"router_interfaces", 2},
+                 {"ten_gigabit", false},
+                 {"bonding", true}});
+    EXPECT_EQ(ask({"show", "mode"}), (Outcome{0,
+                                              "mode                router\n"
+                                              "submode             normal\n"
+                                              "bridge              no\n"
+                                              "router              yes\n"
+                                              "server              no\n"
+                                              "inline router       yes\n"
+                                              "router interfaces   2\n"
+                                              "10 gigabit          no\n"
+                                              "bonding             yes\n",
+                                              ""}));
+    EXPECT_EQ(request(), (json{{"command", "show"}, {"what", "mode"}}));
+}
+
+TEST_F(OvctlTest, ARefusedCommitNamesEveryNodeAndModule)
+{
+    refuse_with({"refused",
+                 "two checks refuse",
+                 {{"/a/b", "at most 5 are possible", "limits", 0},
+                  {"", "out of tunnels", "tunnels", 0},
+                  {"/c", "no such mode", "", 0}}});
+    EXPECT_EQ(ask({"commit"}), (Outcome{1, "",
+                                        "mgmtd refused the commit:\n"
+                                        "  /a/b: at most 5 are possible (limits)\n"
+                                        "  out of tunnels (tunnels)\n"
+                                        "  /c: no such mode\n"}));
+}
+
+TEST_F(OvctlTest, ARefusedFileNamesItsLines)
+{
+    refuse_with({"bad-lines",
+                 "2 lines are bad",
+                 {{"", "no type", "", 3}, {"/a", "uint33 is no type", "", 12}}});
+    EXPECT_EQ(ask({"load", "-"}, "x"), (Outcome{1, "",
+                                                "mgmtd refused the file:\n"
+                                                "  line 3: no type\n"
+                                                "  line 12: /a: uint33 is no type\n"}));
+}
+
+TEST_F(OvctlTest, ARefusalWithoutDetailsIsOneLine)
+{
+    refuse_with({"not-found", "no node /a in the running configuration"});
+    EXPECT_EQ(
+        ask({"get", "/a"}),
+        (Outcome{1, "", "mgmtd refused the query: no node /a in the running configuration\n"}));
+}
+
+TEST_F(OvctlTest, AFailureOfTheDaemonIsCalledOne)
+{
+    refuse_with({"internal", "the disk is full"});
+    EXPECT_EQ(ask({"commit"}), (Outcome{1, "", "mgmtd failed at the commit: the disk is full\n"}));
+}
+
+TEST_F(OvctlTest, JsonPrintsTheAnswerOnOneLine)
+{
+    answer_with({{"number", 7}, {"changes", 2}, {"warnings", json::array()}});
+    EXPECT_EQ(ask({"--json", "commit"}),
+              (Outcome{0,
+                       R"({"ok":true,"result":{"changes":2,"number":7,"warnings":[]}})"
+                       "\n",
+                       ""}));
+    refuse_with({"refused", "no", {{"/a", "too large", "limits", 0}}});
+    EXPECT_EQ(ask({"commit", "--json"}),
+              (Outcome{1,
+                       R"({"error":{"code":"refused","details":[{"message":"too large",)"
+                       R"("module":"limits","node":"/a"}],"message":"no"},"ok":false})"
+                       "\n",
+                       ""}));
+}
+
+TEST_F(OvctlTest, AnAnswerThatLacksSomethingIsAProtocolError)
+{
+    answer_with({{"changes", 2}});
+    const Outcome outcome = ask({"commit"});
+    EXPECT_EQ(outcome.exit, 4);
+    EXPECT_NE(outcome.err.find("ovctl: mgmtd's answer lacks something: "), std::string::npos);
+    EXPECT_NE(outcome.err.find("warnings"), std::string::npos);
+}
+
+TEST_F(OvctlTest, TheSocketMayComeFromTheEnvironment)
+{
+    answer_with({{"changes", json::array()}});
+    EXPECT_EQ(run({"diff"}, {}, {"OVCTL_SOCKET=" + path()}), (Outcome{0, "", ""}));
+    EXPECT_EQ(run({"--socket", path(), "diff"}, {}, {"OVCTL_SOCKET=/nowhere"}),
+              (Outcome{0, "", ""}))
+        << "the command line goes first";
+    EXPECT_EQ(run({"diff", "--socket", path()}), (Outcome{0, "", ""}));
+}
+
+TEST(OvctlWithoutDaemonTest, SaysWhatToDo)
+{
+    const std::string reason = "cannot connect to /nowhere/socket: No such file or directory; is "
+                               "mgmtd running, and is this its --socket?";
+    EXPECT_EQ(run({"--socket", "/nowhere/socket", "status"}),
+              (Outcome{3, "", "ovctl: " + reason + "\n"}));
+    EXPECT_EQ(run({"--socket", "/nowhere/socket", "--json", "status"}),
+              (Outcome{3,
+                       R"({"error":{"code":"unreachable","details":[],"message":")" + reason +
+                           "\"},\"ok\":false}\n",
+                       ""}));
+}
+
+TEST(OvctlWithoutDaemonTest, ADaemonThatDoesNotAnswerIsNotWaitedForForEver)
+{
+    const TempDir dir;
+    const ListenSocket silent(dir.path("socket"));
+    EXPECT_EQ(run({"--socket", dir.path("socket"), "--timeout", "0.05", "status"}),
+              (Outcome{3, "",
+                       "ovctl: mgmtd did not answer \"status\" within 50 ms; it may still be at "
+                       "work on it\n"}));
+}
+
+TEST(OvctlWithoutDaemonTest, AWrongCommandLineIsAUsageError)
+{
+    const std::string hint = "Run with --help for more information.\n";
+    EXPECT_EQ(run({}), (Outcome{2, "", "A subcommand is required\n" + hint}));
+    EXPECT_EQ(run({"show"}), (Outcome{2, "", "A subcommand is required\n" + hint}));
+    EXPECT_EQ(run({"get"}), (Outcome{2, "", "name is required\n" + hint}));
+    for (const std::vector<std::string> &words : {std::vector<std::string>{"fly"},
+                                                  {"get", "/a", "--fast"},
+                                                  {"get", "/a", "/b"},
+                                                  {"--timeout", "0", "status"}}) {
+        const Outcome outcome = run(words);
+        EXPECT_EQ(outcome.exit, 2) << words[0];
+        EXPECT_EQ(outcome.out, "");
+        EXPECT_TRUE(outcome.err.ends_with(hint)) << outcome.err;
+    }
+}
+
+TEST(OvctlWithoutDaemonTest, HelpListsCommandsExamplesAndExitCodes)
+{
+    const Outcome all = run({"--help"});
+    EXPECT_EQ(all.exit, 0);
+    for (const char *word : {"get", "set", "delete", "load", "check", "commit", "diff", "discard",
+                             "status", "show", "--socket", "--json", "OVCTL_SOCKET", "Exit codes:"})
+        EXPECT_NE(all.out.find(word), std::string::npos) << word;
+    const Outcome one = run({"commit", "--help"});
+    EXPECT_EQ(one.exit, 0);
+    EXPECT_NE(one.out.find("--comment TEXT"), std::string::npos) << one.out;
+    EXPECT_NE(one.out.find("Example:\n  ovctl commit"), std::string::npos) << one.out;
+}
+
+} // namespace
+} // namespace ovhost

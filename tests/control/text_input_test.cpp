@@ -1,0 +1,61 @@
+// Texts that ovctl sends: host/ovctl/text_input.h.
+
+#include "host/ovctl/text_input.h"
+
+#include "tests/control/temp_dir.h"
+
+#include <gtest/gtest.h>
+
+#include <string>
+
+namespace ovhost
+{
+namespace
+{
+
+std::string fault_of(const std::string &text)
+{
+    try {
+        static_cast<void>(checked_utf8(text, "VALUE"));
+    } catch (const UsageError &error) {
+        return error.what();
+    }
+    return "none";
+}
+
+TEST(TextInputTest, EveryFormOfUtf8IsTaken)
+{
+    for (const char *text :
+         {"", "plain", "\x7f", "\xc2\x80", "\xdf\xbf", "\xe0\xa0\x80", "\xed\x9f\xbf",
+          "\xee\x80\x80", "\xef\xbf\xbf", "\xf0\x90\x80\x80", "\xf4\x8f\xbf\xbf"})
+        EXPECT_EQ(fault_of(text), "none") << text;
+    EXPECT_EQ(fault_of(std::string("a\0b", 3)), "none");
+}
+
+TEST(TextInputTest, WhatIsNotUtf8IsRefusedWithItsLine)
+{
+    EXPECT_EQ(fault_of("caf\xe9"), "VALUE is not UTF-8 in line 1: convert it first");
+    EXPECT_EQ(fault_of("one\ntwo\nthr\xff"), "VALUE is not UTF-8 in line 3: convert it first");
+}
+
+TEST(TextInputTest, FormsThatStandForNothingAreRefused)
+{
+    // A lone continuation; overlong forms; a surrogate; past the last character; cut short.
+    for (const char *text : {"\x80", "\xc0\x80", "\xc1\xbf", "\xe0\x9f\xbf", "\xed\xa0\x80",
+                             "\xf0\x8f\xbf\xbf", "\xf4\x90\x80\x80", "\xf5\x80\x80\x80", "\xc2",
+                             "\xe1\x80", "\xf1\x80\x80", "\xe1\x80g", "\xf1\x80\x80g"})
+        EXPECT_NE(fault_of(text), "none") << text;
+}
+
+TEST(TextInputTest, AFileIsReadWhole)
+{
+    const test::TempDir dir;
+    std::string text;
+    for (int i = 0; i < 50000; ++i)
+        text += std::to_string(i) + "\n";
+    test::write_file(dir.path("f"), text);
+    EXPECT_EQ(read_text(dir.path("f")), text);
+}
+
+} // namespace
+} // namespace ovhost
