@@ -177,6 +177,12 @@ std::vector<Operation> operations_called(const FaultRow &row)
     return called;
 }
 
+// How a row is named in a list of tests.
+std::string name_of(const testing::TestParamInfo<FaultRow> &about)
+{
+    return about.param.function + "__" + about.param.situation;
+}
+
 class FaultLoop : public testing::TestWithParam<FaultRow>
 {
 };
@@ -194,10 +200,7 @@ TEST_P(FaultLoop, EveryCallFailsInTurn)
     }
 }
 
-INSTANTIATE_TEST_SUITE_P(Exported, FaultLoop, testing::ValuesIn(fault_rows()),
-                         [](const auto &about) {
-                             return about.param.function + "__" + about.param.situation;
-                         });
+INSTANTIATE_TEST_SUITE_P(Exported, FaultLoop, testing::ValuesIn(fault_rows()), name_of);
 
 TEST(FaultTable, HasARowForEveryExportedFunction)
 {

@@ -9,6 +9,7 @@
 #include "tests/support/fault_layer.h"
 #include "tests/support/host_fixture.h"
 
+#include <ostream>
 #include <string>
 #include <vector>
 
@@ -111,6 +112,12 @@ struct FaultRow {
     Outcome without_fault;
     std::vector<FailureRow> failures; // the first that fits counts
 };
+
+// How GoogleTest shows a row.
+inline void PrintTo(const FaultRow &row, std::ostream *out)
+{
+    *out << row.function << ' ' << row.situation;
+}
 
 // All rows of all units.
 const std::vector<FaultRow> &fault_rows();

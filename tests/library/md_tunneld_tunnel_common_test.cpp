@@ -2,7 +2,7 @@
 
 #include "tests/library/library_test.h"
 
-#include <cstdlib>
+#include <ostream>
 #include <string>
 
 using namespace ovtest;
@@ -296,6 +296,11 @@ struct Flag {
     tbool (*question)(const mdb_db *);
     const char *node;
 };
+
+void PrintTo(const Flag &flag, std::ostream *out)
+{
+    *out << flag.function;
+}
 
 class HardwareFlag : public LibraryTest, public testing::WithParamInterface<Flag>
 {

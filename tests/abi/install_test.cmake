@@ -1,0 +1,56 @@
+# Builds the library alone from its sources, installs it, and builds a project against what was
+# installed: once with the CMake package, once with pkg-config.
+#
+#   cmake -DSOURCE_DIR=... -DWORK_DIR=... -DC_COMPILER=... -DCXX_COMPILER=... -DGENERATOR=...
+#     -DCONSUMER_DIR=... -P install_test.cmake
+
+set(prefix ${WORK_DIR}/prefix)
+set(compilers -G ${GENERATOR} -DCMAKE_C_COMPILER=${C_COMPILER} -DCMAKE_CXX_COMPILER=${CXX_COMPILER})
+
+function(run)
+  execute_process(COMMAND ${ARGV} RESULT_VARIABLE status OUTPUT_VARIABLE output
+    ERROR_VARIABLE output)
+  if(NOT status EQUAL 0)
+    list(JOIN ARGV " " command)
+    message(FATAL_ERROR "${command}\nfailed:\n${output}")
+  endif()
+endfunction()
+
+function(expect_file path)
+  if(NOT EXISTS ${path})
+    message(FATAL_ERROR "not installed: ${path}")
+  endif()
+endfunction()
+
+file(REMOVE_RECURSE ${WORK_DIR})
+run(${CMAKE_COMMAND} -S ${SOURCE_DIR} -B ${WORK_DIR}/build ${compilers}
+  -DOVMD_BUILD_HOST=OFF -DOVMD_BUILD_TESTS=OFF
+  -DCMAKE_INSTALL_PREFIX=${prefix} -DCMAKE_INSTALL_LIBDIR=lib)
+run(${CMAKE_COMMAND} --build ${WORK_DIR}/build)
+run(${CMAKE_COMMAND} --install ${WORK_DIR}/build)
+
+foreach(name libovmd.so libovmd.so.1 libovmd.so.1.0.0 pkgconfig/ovmd.pc
+    cmake/ovmd/ovmd-config.cmake cmake/ovmd/ovmd-config-version.cmake)
+  expect_file(${prefix}/lib/${name})
+endforeach()
+foreach(folder framework include/orvale)
+  file(GLOB headers RELATIVE ${SOURCE_DIR}/${folder} ${SOURCE_DIR}/${folder}/*.h)
+  cmake_path(GET folder FILENAME installed)
+  foreach(header ${headers})
+    expect_file(${prefix}/include/ovmd/${installed}/${header})
+  endforeach()
+endforeach()
+
+run(${CMAKE_COMMAND} -S ${CONSUMER_DIR} -B ${WORK_DIR}/consumer ${compilers}
+  -DCMAKE_PREFIX_PATH=${prefix})
+run(${CMAKE_COMMAND} --build ${WORK_DIR}/consumer)
+
+set(ENV{PKG_CONFIG_PATH} ${prefix}/lib/pkgconfig)
+execute_process(COMMAND pkg-config --cflags --libs ovmd OUTPUT_VARIABLE flags
+  OUTPUT_STRIP_TRAILING_WHITESPACE COMMAND_ERROR_IS_FATAL ANY)
+separate_arguments(flags UNIX_COMMAND "${flags}")
+set(strict -Wall -Wextra -Wpedantic -Werror -shared -fPIC)
+run(${C_COMPILER} -std=c11 ${strict} ${CONSUMER_DIR}/consumer.c ${flags}
+  -o ${WORK_DIR}/consumer-c.so)
+run(${CXX_COMPILER} -std=c++20 ${strict} ${CONSUMER_DIR}/consumer.cpp ${flags}
+  -o ${WORK_DIR}/consumer-cpp.so)
