@@ -2,8 +2,9 @@
  * The bail rule: how a function leaves when something it called has failed.
  *
  * The code is logged once at each level it passes, with the function and the source unit, and is
- * returned unchanged. 14120 ("Operation cancelled") passes upward without a line. What a function
- * owns is released by its owners' destructors (C++) or its single clean-up path (C).
+ * returned unchanged. 14120 ("Operation cancelled") passes upward without a line. The macros
+ * return, so what a function owns is held by objects whose destructors release it; in C they are
+ * for functions that own nothing yet.
  *
  * A source unit names itself once, in scope of its functions:
  *     static const char bail_unit[] = "md_db_default";

@@ -4,7 +4,9 @@
  * mdb_db.h reads and writes bindings in a database; tstr_array.h holds the parts of a name.
  *
  * A node name is a path such as "/ov/tunneld/system/config/mode". A slash inside a component is
- * written "\/", a backslash "\\". In a pattern the component "*" matches exactly one component.
+ * written "\/", a backslash "\\"; "\*" is a literal star where a name is taken as a pattern. Any
+ * other backslash makes a name invalid. In a pattern the component "*" matches exactly one
+ * component.
  */
 #ifndef FRAMEWORK_BNODE_H
 #define FRAMEWORK_BNODE_H
@@ -141,7 +143,7 @@ void bn_binding_free(bn_binding **binding);
 /*
  * An attribute as text. `ret` receives a new copy, which the caller releases with free(), or null
  * when the binding does not have the attribute (not an error). `type` is the type the caller
- * expects; `flags` is 0.
+ * expects, bt_any for every one; `flags` is 0.
  * Returns 0; 14001 on a null argument; 14020 when the attribute is of another type; 14000 when out
  * of memory.
  */

@@ -29,9 +29,11 @@ enum {
     lc_err_parse_error = 14012,
     lc_err_file_not_found = 14013,
     lc_err_io_error = 14014,
+    lc_err_closed = 14016,
     lc_err_bad_type = 14020,
     /* A quiet failure: passed upward like any other code, never logged. */
-    lc_err_cancelled = 14120
+    lc_err_cancelled = 14120,
+    lc_err_bad_name = 14501
 };
 
 /* Texts of the status codes, for the log line of the bail rule alone. */
@@ -87,7 +89,7 @@ const char *lc_enum_to_string_quiet_null(const lc_enum_string_map *map, uint32 c
 /*
  * The code of a text, compared byte for byte with the rows in order; the first match counts.
  * `ret` receives the code on success and is left alone on failure.
- * Returns 0; lc_err_bad_type (14020) when no row has the text.
+ * Returns 0; lc_err_bad_type (14020) when no row has the text; 14001 on a null argument.
  */
 OV_NODISCARD int lc_string_to_enum(const lc_enum_string_map *map, const char *text, uint32 *ret);
 

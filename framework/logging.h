@@ -1,9 +1,12 @@
 /*
  * The two log entry points of the host and the two gates in front of the second.
  *
- * lc_log_internal is for error lines and debug traces: its caller does not look at a threshold.
- * ov_log_internal is for everything else, and its caller decides with OV_LOG or OV_LOG_MODULE
- * whether the line is emitted at all. bail.h writes its lines with the first.
+ * lc_log_internal is for the lines of the bail rule (bail.h) and for debug traces: it writes
+ * whatever it is given, so the caller of a trace asks lc_log_check_level first. ov_log_internal is
+ * for all other lines; its caller decides with OV_LOG or OV_LOG_MODULE whether the line is emitted
+ * at all.
+ *
+ * A %s argument of a line may be null, and a host writes "(null)" for it, as glibc does.
  */
 #ifndef FRAMEWORK_LOGGING_H
 #define FRAMEWORK_LOGGING_H
@@ -37,7 +40,7 @@ extern unsigned char ov_log_module_levels[];
 int lc_log_internal(const char *function, const char *unit, int line, uint32 flags, uint32 zero,
                     int level, const char *format, ...) OV_PRINTF(7, 8);
 
-/* Whether a line of this level would be emitted: lets a caller skip building its arguments. */
+/* Whether a line of this level is of interest: lets a caller skip it and building its arguments. */
 tbool lc_log_check_level(int level);
 
 /* Writes one line. `function` may be null; `zero` is always 0. */

@@ -80,8 +80,8 @@ OV_NODISCARD int mdb_get_matching_tstr_array(md_commit *commit, const mdb_db *db
 /*
  * Writes one node from text; its name is built printf-style. `op` is one of bsso_, `flags` 0; for
  * bsso_delete type and value are ignored and the value may be null.
- * Returns 0; 14001 on a null argument; 14002 when the database may not be written (not in the
- * checking phase of a commit) or `op` is unknown; 14009 when the name is not a node name; 14020
+ * Returns 0; 14001 on a null argument; 14002 when the host does not let this database be
+ * written at this moment, or `op` is unknown; 14009 when the name is not a node name; 14020
  * when the text does not fit the type; 14000 when out of memory. On failure nothing is written.
  */
 OV_NODISCARD int mdb_set_node_str(md_commit *commit, mdb_db *db, int op, uint32 flags, bn_type type,

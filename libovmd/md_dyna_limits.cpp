@@ -97,7 +97,7 @@ int write_dyna_limits_conf(const mdb_db *new_db)
     for (const limit_line *line = limit_lines; line->node != nullptr; ++line) {
         uint32 limit = 0;
         BAIL_ERROR(read_limit(new_db, line->node, limit));
-        // The readers expect a signed number; limits beyond its range have always been negative.
+        // The format is signed: a limit beyond its range stands there as a negative number.
         (void)fprintf(file.get(), "%s %d\n", line->key, static_cast<int32>(limit));
     }
     BAIL_ERROR(file.finish());

@@ -24,7 +24,8 @@ struct event_binding {
     bool shows_value;    // the value stands in that line, before the code
 };
 
-// The order is the message's order: jsond expects the kind of the change ahead of its index.
+// The order is the message's: the kind of the change stands ahead of its index, and receivers may
+// count on it.
 constexpr event_binding event_bindings[] = {
     {"/mgmtd/notification/dbchange/0/change_type", bt_string,
      "Cannot add 'type' binding to msg, err=%d", false},
@@ -38,6 +39,28 @@ constexpr event_binding event_bindings[] = {
      "Cannot add 'old_value' binding (%s) to msg, err=%d", true},
 };
 constexpr size_t num_event_bindings = sizeof event_bindings / sizeof event_bindings[0];
+
+// The compiler checks formats only where they are literals of the call.
+constexpr bool takes_text(const char *format)
+{
+    for (; *format != '\0'; ++format) {
+        if (format[0] == '%' && format[1] == 's') {
+            return true;
+        }
+    }
+    return false;
+}
+
+constexpr bool failures_fit_their_arguments()
+{
+    for (const event_binding &binding : event_bindings) {
+        if (takes_text(binding.failure) != binding.shows_value) {
+            return false;
+        }
+    }
+    return true;
+}
+static_assert(failures_fit_their_arguments());
 
 struct dbc_event {
     const char *function; // the exported function, which the error lines name
@@ -83,7 +106,7 @@ bool deliver(gcl_session *session, bn_request *request, const dbc_event &event)
 {
     if (session == nullptr) {
         OV_LOG(ov_log_notice, "Cannot send event to jsond as jsond_session is null");
-        return true; // the notice below has always been written for a peer that is away, too
+        return true; // the notice that follows is written for a peer that is away, too
     }
     const int err = bn_request_msg_send(session, request);
     if (err == lc_err_cancelled) {

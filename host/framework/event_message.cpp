@@ -46,10 +46,8 @@ int bn_request_msg_send(gcl_session *session, bn_request *request)
     if (session == nullptr || request == nullptr) {
         return lc_err_unexpected_null;
     }
-    return at_c_boundary([&]() -> int {
-        constexpr int lc_err_closed = 14016;
-        return session->send(*request) ? lc_err_no_error : lc_err_closed;
-    });
+    return at_c_boundary(
+        [&]() -> int { return session->send(*request) ? lc_err_no_error : lc_err_closed; });
 }
 
 void bn_request_msg_free(bn_request **request)

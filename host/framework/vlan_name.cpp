@@ -11,7 +11,6 @@
 namespace
 {
 
-constexpr int lc_err_bad_name = 14501;
 constexpr std::size_t longest_name = 15;
 constexpr unsigned first_vlan = 1;
 constexpr unsigned last_vlan = 4094;

@@ -11,8 +11,9 @@
  *
  * Blanks (spaces, tabs) before an entry are skipped; all others belong to the fields. Fields end at
  * the next comma, without quoting: a value cannot hold a comma, and what follows a third comma is
- * ignored. Type names are those of bn_type_map (framework/bnode.h). A removal's type and value are
- * optional; without a type the value is dropped.
+ * ignored. A "#" further on, and a carriage return at the end, are part of their field, as is a
+ * blank behind the "-" of a removal. Type names are those of bn_type_map (framework/bnode.h). A
+ * removal's type and value are optional; without a type the value is dropped.
  *
  * A bad line is logged and left out, and reading goes on. The status is that of the last entry
  * line: an error in an earlier line is logged only.
@@ -43,17 +44,18 @@ typedef struct bn_str_value {
  * with a count of 0 when no line was good. The caller releases an array with bn_str_value_free (or,
  * at a count of 0, with free()). An array pointer is left alone when the file is missing, empty or
  * cannot be read, and is set to null when it has no line of that kind.
- * Returns 0; 14012 when the last entry line lacks its name or type; lc_string_to_enum's code when
- * its type is unknown; 14001 when memory for its texts ran out; the code of lf_test_exists or
- * lf_read_file_lines. When there is no memory for the arrays: 0, and nothing is handed out, because
- * defaults are optional.
+ * Returns 0; 14012 when the last entry line lacks its name, or its type if it is a value;
+ * lc_string_to_enum's code when its type is unknown; 14001 when memory for its texts ran out; the
+ * code of lf_test_exists or lf_read_file_lines. When there is no memory for the arrays: 0, and
+ * nothing is handed out, because defaults are optional.
  */
 OV_NODISCARD OV_API int db_default_get_all(bn_str_value **ret_values, uint32 *ret_num_values,
                                            bn_str_value **ret_deletes, uint32 *ret_num_deletes);
 
 /*
  * The defaults of the appliance's model: "/opt/orvale/defdb.conf.NAME", NAME being
- * get_config_name(). Without a name, or when conf_file_okay rejects the file, there are none.
+ * get_config_name(); the path is cut at 127 characters. Without a name, or when conf_file_okay
+ * rejects the file, there are none.
  *
  * Arguments as in db_default_get_all, but nothing is handed out unless the status is 0, and an
  * array only when its count is not 0: the pointer is left alone otherwise.

@@ -20,8 +20,8 @@ OV_C_BEGIN
  *     max_ssl_flows   ssl_flows        SSL flows
  *     nm_ram_size     nm_ram_size      memory for network monitoring
  *
- * A value is an unsigned 32-bit number written as a signed one; an absent node writes 0. There are
- * never fewer than six lines: when something fails there is no file.
+ * A value is an unsigned 32-bit number written as a signed one; an absent node writes 0. When
+ * writing fails the file is removed: no file with fewer than six lines stays behind.
  *
  * new_db  the database to read; during a commit, the one that will be in force after it
  * Returns 0; 14001 when the file cannot be created; 14014 when it cannot be written to its end; the

@@ -16,7 +16,8 @@ OV_C_BEGIN
  * db             read only
  * ret_str_value  receives a new text, which the caller releases with free(), or null when the node
  *                is absent; null on failure
- * Returns 0; 14001 when ret_str_value is null or the node holds no text; a query's code.
+ * Returns 0; 14001 when an argument is null, the node holds no text, or memory has run out; a
+ * query's code.
  */
 OV_NODISCARD OV_API int md_get_db_system_mode(const mdb_db *db, char **ret_str_value);
 
@@ -25,7 +26,7 @@ OV_NODISCARD OV_API int md_get_db_system_mode(const mdb_db *db, char **ret_str_v
  *
  * ret_str_value  receives a new text, which the caller releases with free(): "normal" when the node
  *                is absent or holds no text; null on failure
- * Returns 0; 14001 when ret_str_value is null; a query's code.
+ * Returns 0; 14001 when an argument is null or memory has run out; a query's code.
  */
 OV_NODISCARD OV_API int md_get_db_bridge_submode(const mdb_db *db, char **ret_str_value);
 

@@ -39,14 +39,6 @@ class owner
         }
     }
 
-    // Hands the object to a caller who owns it from then on.
-    T *release()
-    {
-        T *const object = object_;
-        object_ = nullptr;
-        return object;
-    }
-
   private:
     T *object_ = nullptr;
 };

@@ -73,7 +73,8 @@ int convert_line_to_bn_str_value(const char *line, type_memo &memo, bn_str_value
     owned_text type_name;
     const int err = look_up_type(__func__, memo, fields.type, type, type_name);
     if (err != 0) {
-        if (type_name.get() != nullptr) {
+        // A lookup that was cancelled has not found the type unknown.
+        if (type_name.get() != nullptr && err != lc_err_cancelled) {
             BAIL_LOG("Unable to convert %s type", type_name.get());
         }
         return err;

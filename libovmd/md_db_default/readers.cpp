@@ -25,7 +25,7 @@ void zero_count(uint32 *count)
     }
 }
 
-// Entries that belong to this unit until they are known to be all good.
+// Entries that belong to this unit until the file has been read with success.
 struct private_entries {
     bn_str_value *entries = nullptr;
     uint32 count = 0;

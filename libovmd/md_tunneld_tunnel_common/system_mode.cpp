@@ -36,6 +36,10 @@ int read_text(const mdb_db *db, const char *node, owned_text &ret_text, bool &re
 // A flag node on behalf of a yes/no question, which the error lines name; absent means false.
 tbool flag_is_set(const char *question, const mdb_db *db, const char *node)
 {
+    if (db == nullptr) {
+        (void)bail_report_null(question, bail_unit, __LINE__);
+        return false;
+    }
     tbool flag = false;
     owned_binding binding;
     int err = mdb_get_node_binding(nullptr, db, node, 0, binding.out());
@@ -67,6 +71,7 @@ int md_get_db_system_mode(const mdb_db *db, char **ret_str_value)
 {
     BAIL_NULL(ret_str_value);
     *ret_str_value = nullptr;
+    BAIL_NULL(db);
 
     owned_text mode;
     bool present = false;
@@ -84,6 +89,7 @@ int md_get_db_bridge_submode(const mdb_db *db, char **ret_str_value)
 {
     BAIL_NULL(ret_str_value);
     *ret_str_value = nullptr;
+    BAIL_NULL(db);
 
     owned_text submode;
     bool present = false;
