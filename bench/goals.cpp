@@ -1,5 +1,7 @@
 #include "bench/goals.h"
 
+#include <unistd.h>
+
 #include <cstdio>
 #include <map>
 #include <optional>
@@ -13,6 +15,8 @@ namespace
 class MedianKeeper : public benchmark::ConsoleReporter
 {
   public:
+    MedianKeeper() : ConsoleReporter(::isatty(STDOUT_FILENO) != 0 ? OO_ColorTabular : OO_Tabular) {}
+
     void ReportRuns(const std::vector<Run> &runs) override
     {
         for (const Run &run : runs) {
