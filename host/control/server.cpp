@@ -153,7 +153,7 @@ json ControlServer::hello(Connection &from, const json &request)
         throw RequestError(error_code::bad_request, "this connection is registered as peer " +
                                                         registered +
                                                         " already: use another connection");
-    const json result = {{"peer", name}, {"protocol", control_protocol_version}};
+    json result = {{"peer", name}, {"protocol", control_protocol_version}};
     if (!registered.empty())
         return result;
 

@@ -25,7 +25,7 @@ void report(const std::string &message)
 }
 
 int work(const ovhost::JsondOptions &options)
-try {
+{
     using std::chrono::milliseconds;
     std::signal(SIGPIPE, SIG_IGN);
     const ovhost::SignalPipe stop;
@@ -33,14 +33,9 @@ try {
     ovhost::JsondPeer peer(options, stop.fd(), writer,
                            ovhost::Backoff(milliseconds(100), milliseconds(5000)), report);
     return peer.run();
-} catch (const std::exception &error) {
-    report(error.what());
-    return 1;
 }
 
-} // namespace
-
-int main(int argc, char **argv)
+int run(int argc, char **argv)
 {
     ovhost::JsondOptions options{.socket = "/run/mgmtd/control.sock", .output = {}, .retry = false};
     CLI::App app("Registers with mgmtd as the peer \"jsond\" and writes each event as a JSON line.",
@@ -57,4 +52,16 @@ int main(int argc, char **argv)
         return app.exit(error) == 0 ? 0 : exit_usage;
     }
     return work(options);
+}
+
+} // namespace
+
+int main(int argc, char **argv)
+{
+    try {
+        return run(argc, argv);
+    } catch (const std::exception &error) {
+        report(error.what());
+        return 1;
+    }
 }

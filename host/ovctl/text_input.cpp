@@ -23,7 +23,7 @@ namespace
 struct Utf8Form {
     unsigned char first_low;
     unsigned char first_high;
-    std::size_t following;
+    unsigned char following;
     unsigned char second_low;
     unsigned char second_high;
 };
@@ -48,7 +48,7 @@ std::size_t utf8_length(std::string_view text)
         for (std::size_t at = 2; at <= form.following; ++at)
             if ((byte(at) & 0xc0) != 0x80)
                 return 0;
-        return form.following + 1;
+        return form.following + std::size_t{1};
     }
     return 0;
 }

@@ -8,10 +8,12 @@
 #include "tests/control/test_server.h"
 
 #include <gtest/gtest.h>
+#include <sys/resource.h>
+#include <unistd.h>
 
+#include <memory>
 #include <stdexcept>
 #include <string>
-#include <unistd.h>
 #include <vector>
 
 namespace ovhost
@@ -173,6 +175,42 @@ TEST(ServerTest, AHundredClientsAreServedAtOnce)
                       echo_answer(i, std::to_string(round)));
     }
     EXPECT_EQ(server.client_count(), 100U);
+}
+
+/// Leaves the process one more descriptor until it goes.
+class OneMoreDescriptor
+{
+  public:
+    OneMoreDescriptor()
+    {
+        ::getrlimit(RLIMIT_NOFILE, &before_);
+        const UniqueFd lowest_free(::dup(STDIN_FILENO));
+        rlimit tight = before_;
+        tight.rlim_cur = static_cast<rlim_t>(lowest_free.get()) + 1;
+        ::setrlimit(RLIMIT_NOFILE, &tight);
+    }
+    ~OneMoreDescriptor() { ::setrlimit(RLIMIT_NOFILE, &before_); }
+    OneMoreDescriptor(const OneMoreDescriptor &) = delete;
+    OneMoreDescriptor &operator=(const OneMoreDescriptor &) = delete;
+
+  private:
+    rlimit before_{};
+};
+
+TEST(ServerTest, AClientIsTakenOnceThereAreDescriptorsAgain)
+{
+    TestServer server;
+    std::unique_ptr<RawClient> client;
+    {
+        const OneMoreDescriptor limit;
+        client = std::make_unique<RawClient>(server.path());
+        ASSERT_TRUE(eventually([&] { return !server.logged("cannot accept").empty(); }));
+        client->send(echo_line(1, "a"));
+    }
+    EXPECT_EQ(client->line(), echo_answer(1, "a"));
+    EXPECT_EQ(server.logged("cannot accept a client: Too many open files; trying again in 1 s"),
+              server.logged("cannot accept"));
+    EXPECT_EQ(server.logged("cannot accept").size(), 1U) << "the loop ran hot";
 }
 
 TEST(ServerTest, ASecondServerOnTheSamePathIsRefused)
