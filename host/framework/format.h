@@ -2,14 +2,19 @@
 // printf-style arguments to text of any length, for the operations that take a format.
 
 #include <cstdarg>
-#include <string>
+#include <cstdlib>
+#include <memory>
 
 namespace ovhost
 {
 
-/// Throws std::bad_alloc when out of memory, std::invalid_argument when the format or an argument
-/// cannot be printed. Leaves `arguments` to the caller's va_end.
-[[nodiscard]] __attribute__((format(printf, 1, 0))) std::string format_text(const char *format,
-                                                                            va_list arguments);
+struct FreeText {
+    void operator()(char *text) const noexcept { std::free(text); }
+};
+using OwnedText = std::unique_ptr<char, FreeText>;
+
+/// Null when out of memory, or when the format or an argument cannot be printed.
+[[nodiscard]] __attribute__((format(printf, 1, 0))) OwnedText
+print_text(const char *format, va_list arguments) noexcept;
 
 } // namespace ovhost

@@ -22,14 +22,14 @@ namespace ovhost
 
 /// One line on its way to the sink, with everything its caller said. The views are borrowed.
 struct LogRecord {
-    std::chrono::system_clock::time_point time;
+    std::chrono::system_clock::time_point time = {};
     int level = 0;
-    std::string_view function; ///< empty when the caller does not name it
-    std::string_view unit;     ///< empty when the caller does not name it
+    std::string_view function = {}; ///< empty when the caller does not name it
+    std::string_view unit = {};     ///< empty when the caller does not name it
     int line = 0;
     uint32 flags = 0;
     uint32 zero = 0;
-    std::string_view text;
+    std::string_view text = {};
 };
 
 using LogSink = std::function<void(const LogRecord &record)>;

@@ -42,14 +42,19 @@ void write_to_standard_error(const LogRecord &record)
     [[maybe_unused]] const ssize_t written = ::write(STDERR_FILENO, line.data(), line.size());
 }
 
-void emit(const LogRecord &record)
+/// Sends a line off. One that finds no memory is lost: its caller must go on all the same.
+int emit(LogRecord record) noexcept
 {
-    const LogSink &sink = sink_in_force();
-    if (sink) {
-        sink(record);
-    } else {
-        write_to_standard_error(record);
-    }
+    return at_c_boundary([&record]() -> int {
+        record.time = std::chrono::system_clock::now();
+        const LogSink &sink = sink_in_force();
+        if (sink) {
+            sink(record);
+        } else {
+            write_to_standard_error(record);
+        }
+        return lc_err_no_error;
+    });
 }
 
 std::string format_time(std::chrono::system_clock::time_point time)
@@ -142,18 +147,7 @@ void log_host_line(int level, std::string_view unit, std::string_view text) noex
     if (!lc_log_check_level(level)) {
         return;
     }
-    // A line that finds no memory is lost; its caller goes on.
-    (void)at_c_boundary([&]() -> int {
-        emit({.time = std::chrono::system_clock::now(),
-              .level = level,
-              .function = {},
-              .unit = unit,
-              .line = 0,
-              .flags = 0,
-              .zero = 0,
-              .text = text});
-        return 0;
-    });
+    (void)emit({.level = level, .unit = unit, .text = text});
 }
 
 } // namespace ovhost
@@ -166,20 +160,18 @@ int lc_log_internal(const char *function, const char *unit, int line, uint32 fla
     }
     va_list arguments;
     va_start(arguments, format);
-    const int status = ovhost::at_c_boundary([&]() -> int {
-        const std::string text = ovhost::format_text(format, arguments);
-        ovhost::emit({.time = std::chrono::system_clock::now(),
-                      .level = level,
-                      .function = ovhost::or_empty(function),
-                      .unit = ovhost::or_empty(unit),
-                      .line = line,
-                      .flags = flags,
-                      .zero = zero,
-                      .text = text});
-        return lc_err_no_error;
-    });
+    const ovhost::OwnedText text = ovhost::print_text(format, arguments);
     va_end(arguments);
-    return status;
+    if (!text) {
+        return lc_err_generic_error;
+    }
+    return ovhost::emit({.level = level,
+                         .function = ovhost::or_empty(function),
+                         .unit = ovhost::or_empty(unit),
+                         .line = line,
+                         .flags = flags,
+                         .zero = zero,
+                         .text = text.get()});
 }
 
 tbool lc_log_check_level(int level)
@@ -194,18 +186,12 @@ void ov_log_internal(int level, const char *function, int zero, const char *form
     }
     va_list arguments;
     va_start(arguments, format);
-    // A line that finds no memory is lost; its caller has no status to look at.
-    (void)ovhost::at_c_boundary([&]() -> int {
-        const std::string text = ovhost::format_text(format, arguments);
-        ovhost::emit({.time = std::chrono::system_clock::now(),
-                      .level = level,
-                      .function = ovhost::or_empty(function),
-                      .unit = {},
-                      .line = 0,
-                      .flags = 0,
-                      .zero = static_cast<uint32>(zero),
-                      .text = text});
-        return 0;
-    });
+    const ovhost::OwnedText text = ovhost::print_text(format, arguments);
     va_end(arguments);
+    if (text) {
+        (void)ovhost::emit({.level = level,
+                            .function = ovhost::or_empty(function),
+                            .zero = static_cast<uint32>(zero),
+                            .text = text.get()});
+    }
 }

@@ -7,14 +7,22 @@
 
 #include <cstdarg>
 
-using ovhost::at_c_boundary;
+namespace
+{
+
+int refuse(md_commit &commit, int code, const char *text)
+{
+    return ovhost::at_c_boundary([&] { return commit.refuse(code, text); });
+}
+
+} // namespace
 
 int md_commit_set_return_status_msg(md_commit *commit, int code, const char *text)
 {
     if (commit == nullptr || text == nullptr) {
         return lc_err_unexpected_null;
     }
-    return at_c_boundary([&] { return commit->refuse(code, text); });
+    return refuse(*commit, code, text);
 }
 
 int md_commit_set_return_status_msg_fmt(md_commit *commit, int code, const char *format, ...)
@@ -24,10 +32,9 @@ int md_commit_set_return_status_msg_fmt(md_commit *commit, int code, const char 
     }
     va_list arguments;
     va_start(arguments, format);
-    const int status =
-        at_c_boundary([&] { return commit->refuse(code, ovhost::format_text(format, arguments)); });
+    const ovhost::OwnedText text = ovhost::print_text(format, arguments);
     va_end(arguments);
-    return status;
+    return text ? refuse(*commit, code, text.get()) : lc_err_generic_error;
 }
 
 int md_gcl_find_session(const char *peer_name, gcl_session **ret)
@@ -39,7 +46,7 @@ int md_gcl_find_session(const char *peer_name, gcl_session **ret)
     if (peer_name == nullptr) {
         return lc_err_unexpected_null;
     }
-    return at_c_boundary([&]() -> int {
+    return ovhost::at_c_boundary([&]() -> int {
         *ret = ovhost::find_session(peer_name);
         return lc_err_no_error;
     });

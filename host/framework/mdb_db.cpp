@@ -147,12 +147,14 @@ int mdb_set_node_str(md_commit * /*commit*/, mdb_db *db, int op, uint32 /*flags*
     }
     va_list arguments;
     va_start(arguments, name_format);
-    const int status = at_c_boundary([&] {
-        return write_node(*db, op, ovhost::format_text(name_format, arguments),
-                          Value{type, value == nullptr ? "" : value});
-    });
+    const ovhost::OwnedText name = ovhost::print_text(name_format, arguments);
     va_end(arguments);
-    return status;
+    if (!name) {
+        return lc_err_generic_error;
+    }
+    return at_c_boundary([&] {
+        return write_node(*db, op, name.get(), Value{type, value == nullptr ? "" : value});
+    });
 }
 
 int mdb_set_node_binding(md_commit * /*commit*/, mdb_db *db, int op, uint32 /*flags*/,

@@ -7,7 +7,6 @@
 #include <algorithm>
 #include <compare>
 #include <cstdarg>
-#include <cstdio>
 #include <limits>
 #include <string_view>
 
@@ -65,10 +64,9 @@ int ts_new_sprintf(tstring **ret, const char *format, ...)
     }
     va_list arguments;
     va_start(arguments, format);
-    const int status = at_c_boundary(
-        [&] { return hand_out(ret, tstring{ovhost::format_text(format, arguments)}); });
+    const ovhost::OwnedText text = ovhost::print_text(format, arguments);
     va_end(arguments);
-    return status;
+    return text ? ts_new_str(ret, text.get()) : lc_err_generic_error;
 }
 
 void ts_free(tstring **str)
@@ -134,10 +132,9 @@ char *smprintf(const char *format, ...)
     if (format == nullptr) {
         return nullptr;
     }
-    char *text = nullptr;
     va_list arguments;
     va_start(arguments, format);
-    const int length = vasprintf(&text, format, arguments);
+    ovhost::OwnedText text = ovhost::print_text(format, arguments);
     va_end(arguments);
-    return length < 0 ? nullptr : text;
+    return text.release();
 }

@@ -8,6 +8,7 @@
 #include <gtest/gtest.h>
 
 #include <chrono>
+#include <cwchar>
 #include <string>
 #include <string_view>
 #include <vector>
@@ -140,6 +141,15 @@ TEST(LcLog, ALineThatFindsNoMemoryIsLostAndReported)
         ov_log_internal(3, nullptr, 0, "%s", text.c_str());
         log_host_line(0, "unit", text);
     }
+    EXPECT_THAT(log.lines, IsEmpty());
+}
+
+TEST(LcLog, ALineThatCannotBePrintedIsLostAndReported)
+{
+    LogCapture log;
+    constexpr wint_t no_character = 0x7FFFFFFF;
+    EXPECT_EQ(lc_log_internal("f", "u", 1, 2048, 0, 3, "%lc", no_character), 14000);
+    ov_log_internal(3, nullptr, 0, "%lc", no_character);
     EXPECT_THAT(log.lines, IsEmpty());
 }
 

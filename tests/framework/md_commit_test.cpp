@@ -6,6 +6,7 @@
 
 #include <gtest/gtest.h>
 
+#include <cwchar>
 #include <string>
 
 namespace ovhost::test
@@ -54,6 +55,14 @@ TEST(CommitMessage, AnswersWhatTheCommitAnswers)
     commit.answer = 14002;
     EXPECT_EQ(md_commit_set_return_status_msg(&commit, 1, "late"), 14002);
     EXPECT_EQ(md_commit_set_return_status_msg_fmt(&commit, 1, "%s", "late"), 14002);
+}
+
+TEST(CommitMessage, ReportsAnArgumentThatCannotBePrinted)
+{
+    FakeCommit commit;
+    constexpr wint_t no_character = 0x7FFFFFFF;
+    EXPECT_EQ(md_commit_set_return_status_msg_fmt(&commit, 1, "%lc", no_character), 14000);
+    EXPECT_EQ(commit.last_message, "none");
 }
 
 TEST(CommitMessage, RefusesNull)

@@ -9,6 +9,7 @@
 #include <gmock/gmock.h>
 #include <gtest/gtest.h>
 
+#include <cwchar>
 #include <string>
 
 namespace ovhost::test
@@ -210,6 +211,9 @@ TEST_F(MdbDb, SetRefusesWhatIsWrongAndWritesNothing)
         EXPECT_EQ(set(bsso_delete, bt_string, "x", name), 14009) << name;
     }
     EXPECT_EQ(set(bsso_create, bt_uint8, "256", "/a"), 14020);
+    constexpr wint_t no_character = 0x7FFFFFFF;
+    EXPECT_EQ(mdb_set_node_str(nullptr, &db, bsso_create, 0, bt_string, "x", "/%lc", no_character),
+              14000);
     EXPECT_EQ(db.tree.size(), 5U);
     EXPECT_EQ(db.refused_writes, 0U);
 }

@@ -5,6 +5,7 @@
 
 #include <gtest/gtest.h>
 
+#include <cwchar>
 #include <string>
 
 namespace ovhost::test
@@ -61,6 +62,15 @@ TEST(TString, SprintfRefusesNullFormat)
     const char *no_format = nullptr;
     EXPECT_EQ(ts_new_sprintf(str.out(), no_format, 1), 14001);
     EXPECT_EQ(str.get(), nullptr);
+}
+
+TEST(TString, SprintfReportsAnArgumentThatCannotBePrinted)
+{
+    OwnedString str;
+    constexpr wint_t no_character = 0x7FFFFFFF;
+    EXPECT_EQ(ts_new_sprintf(str.out(), "%lc", no_character), 14000);
+    EXPECT_EQ(str.get(), nullptr);
+    EXPECT_EQ(smprintf("%lc", no_character), nullptr);
 }
 
 TEST(TString, FreeNullsAndIsSafeOnNull)
