@@ -16,7 +16,7 @@
 namespace ovtest
 {
 
-// A line that is expected in the log.
+// A line that is expected in the log. Only gated lines are written for a cancelled operation.
 struct ExpectedLine {
     enum class Kind {
         bail,       // the code by the bail rule

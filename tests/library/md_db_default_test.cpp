@@ -378,6 +378,14 @@ TEST_F(DebugDefaults, ACancelledLineIsSilentInTheBailRule)
     EXPECT_EQ(num_calls(Operation::bail_debug), 0U);
 }
 
+TEST_F(DebugDefaults, ACancelledLookupHasNotFoundTheTypeUnknown)
+{
+    write_file(debug_file, "/a,uint32,1\n");
+    arm({.operation = Operation::lc_string_to_enum, .code = 14120});
+    EXPECT_EQ(read(), "14120 | 0 [] | 0 null");
+    EXPECT_THAT(log_lines(), IsEmpty());
+}
+
 TEST_F(DebugDefaults, ACodeWithoutTextIsLoggedInTheShortForm)
 {
     write_file(debug_file, "/a,string,x\n");

@@ -100,11 +100,25 @@ TEST_F(SystemMode, ANullAddressIsRefused)
     EXPECT_EQ(num_calls(Operation::mdb_get_node_binding), 0U);
 }
 
-TEST_F(SystemMode, ANullDatabaseIsTheHostsToRefuse)
+TEST_F(SystemMode, ANullDatabaseIsRefused)
 {
     EXPECT_EQ(answer(md_get_db_system_mode, nullptr), "14001 null");
-    EXPECT_THAT(log_lines(), ElementsAre(line_of("md_get_db_system_mode",
-                                                 "Error code 14001 (unexpected NULL) returned")));
+    EXPECT_EQ(answer(md_get_db_bridge_submode, nullptr), "14001 null");
+    EXPECT_THAT(log_lines(), ElementsAre(line_of("md_get_db_system_mode", "Unexpected NULL"),
+                                         line_of("md_get_db_bridge_submode", "Unexpected NULL")));
+    EXPECT_EQ(num_calls(Operation::bail_debug), 2U);
+    EXPECT_EQ(num_calls(Operation::mdb_get_node_binding), 0U);
+}
+
+TEST_F(SystemMode, ANullDatabaseHasNoMode)
+{
+    constexpr char null_error[] = "Error code 14001 (unexpected NULL) returned";
+    EXPECT_FALSE(in_library(md_is_db_system_bridge_mode, nullptr));
+    EXPECT_FALSE(in_library(md_is_db_system_inline_router_mode, nullptr));
+    EXPECT_THAT(log_lines(), ElementsAre(line_of("md_get_db_system_mode", "Unexpected NULL"),
+                                         line_of("md_is_db_system_bridge_mode", null_error),
+                                         line_of("md_get_db_system_mode", "Unexpected NULL"),
+                                         line_of("md_is_db_system_router_mode", null_error)));
 }
 
 TEST_F(SystemMode, ABindingWithoutTextIsAnError)
@@ -343,8 +357,8 @@ TEST_P(HardwareFlag, OfAnotherTypeIsLoggedAndFalse)
 TEST_P(HardwareFlag, OfNoDatabaseIsLoggedAndFalse)
 {
     EXPECT_FALSE(in_library(GetParam().question, nullptr));
-    EXPECT_THAT(log_lines(), ElementsAre(line_of(GetParam().function,
-                                                 "Error code 14001 (unexpected NULL) returned")));
+    EXPECT_THAT(log_lines(), ElementsAre(line_of(GetParam().function, "Unexpected NULL")));
+    EXPECT_EQ(num_calls(Operation::mdb_get_node_binding), 0U);
 }
 
 INSTANTIATE_TEST_SUITE_P(All, HardwareFlag,
