@@ -93,6 +93,18 @@ TEST_F(ModelInfoTest, NodesOfAnotherTypeAreAnErrorThatChangesNothing)
     }
 }
 
+TEST_F(ModelInfoTest, ANumberOfAnotherTypeIsNoLimit)
+{
+    LogCapture log;
+    put(db, "/ov/model/limits/max_rmap_entries", {bt_uint16, "5"});
+    EXPECT_EQ(init_model_info(&db), 14020);
+    EXPECT_EQ(get_max_rmap_entries(), 300U);
+    put(db, "/ov/model/limits/max_rmap_entries", {bt_uint32, "5"});
+    put(db, "/ov/model/config/name", {bt_hostname, "branch"});
+    EXPECT_EQ(init_model_info(&db), 14020);
+    EXPECT_EQ(get_config_name(), nullptr);
+}
+
 TEST_F(ModelInfoTest, TooManyTunnelsAreLoweredWithAWarning)
 {
     LogCapture log;
