@@ -255,6 +255,17 @@ TEST_F(FullDisk, LeavesNoFile)
     expect_no_file(line_of("Error code 14014 (generic IO error) returned"));
 }
 
+#if OVTEST_ALLOCATION_LAYER
+// Without memory for a buffer the lines fail one by one, and closing the file succeeds.
+TEST_F(FullDisk, LeavesNoFileWithoutBufferEither)
+{
+    arm({.operation = Operation::allocation, .call = 2});
+    EXPECT_EQ(write(), 14014);
+    EXPECT_TRUE(fault_struck());
+    expect_no_file(line_of("Error code 14014 (generic IO error) returned"));
+}
+#endif
+
 TEST_F(FullDisk, IsRelievedOfTheOldFileFirst)
 {
     fs::remove(std::string(limits_dir) + "/filler");
