@@ -38,9 +38,8 @@ void run(const DaemonOptions &options)
     Configuration configuration(options.state_dir);
     std::optional<PeerSessions> sessions;
     ControlServer *server_view = nullptr;
-    Requests requests(configuration,
-                      {options.model, [&server_view] { return server_view->peers(); },
-                       [&sessions] { sessions->update(); }});
+    Requests requests(configuration, {[&server_view] { return server_view->peers(); },
+                                      [&sessions] { sessions->update(); }});
     EventLoop loop;
     loop.stop_on_signals();
     ControlServer server(loop, options.socket, {}, requests, log_control_line);

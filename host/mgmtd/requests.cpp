@@ -1,11 +1,12 @@
 #include "host/mgmtd/requests.h"
 
+#include "framework/appliance.h"
 #include "framework/logging.h"
 #include "host/control/arguments.h"
 #include "host/control/server.h"
 #include "host/framework/log_config.h"
 #include "host/framework/time_refresh.h"
-#include "host/mgmtd/load_text.h"
+#include "host/modules/load_text.h"
 #include "host/modules/mode.h"
 #include "host/modules/node_access.h"
 #include "host/tree/name.h"
@@ -128,6 +129,7 @@ json Requests::get(const json &request)
         throw RequestError(error_code::bad_request,
                            R"(get: "from" must be "running" or "candidate")");
     }
+    const bool subtree = optional_flag(request, "subtree");
     const Tree &tree =
         from == "running" ? configuration_.running() : configuration_.candidate().tree();
     if (!name.empty() && !tree.exists(name)) {
@@ -139,7 +141,7 @@ json Requests::get(const json &request)
         nodes.push_back(
             {{"name", join_name(node)}, {"type", type_name(value.type)}, {"value", value.text}});
     };
-    if (optional_flag(request, "subtree")) {
+    if (subtree) {
         tree.visit(add, name);
     } else if (const Value *const value = tree.value(name)) {
         add(name, *value);
@@ -151,12 +153,12 @@ json Requests::set(const json &request)
 {
     const std::string name = required_text(request, "name");
     const std::string type_text = required_text(request, "type");
-    bn_type type = 0;
-    if (lc_string_to_enum(bn_type_map, type_text.c_str(), &type) != 0) {
+    const std::optional<bn_type> type = find_type(type_text);
+    if (!type) {
         throw RequestError(error_code::bad_value, name + ": unknown type \"" + type_text + "\"");
     }
     if (const auto fault =
-            configuration_.candidate().set(name, type, required_text(request, "value"))) {
+            configuration_.candidate().set(name, *type, required_text(request, "value"))) {
         throw RequestError(error_code::bad_value, *fault);
     }
     return json::object();
@@ -165,6 +167,10 @@ json Requests::set(const json &request)
 json Requests::erase(const json &request)
 {
     const auto name = required_name(request);
+    if (name.empty()) {
+        throw RequestError(error_code::bad_value,
+                           "\"/\" cannot be deleted: it is the root of all nodes");
+    }
     Candidate &candidate = configuration_.candidate();
     const std::size_t removed = count_values(candidate.tree(), name);
     if (const auto fault = candidate.erase(join_name(name))) {
@@ -183,11 +189,10 @@ json Requests::load(const json &request)
         for (const LineFault &fault : result.faults) {
             details.push_back({fault.node, fault.message, "", fault.line});
         }
-        throw RequestError(error_code::bad_lines,
-                           source + ": " + std::to_string(details.size()) +
-                               (details.size() == 1 ? " bad line" : " bad lines") +
-                               "; nothing was loaded",
-                           std::move(details));
+        const std::string message = source + ": " + std::to_string(details.size()) +
+                                    (details.size() == 1 ? " bad line" : " bad lines") +
+                                    "; nothing was loaded";
+        throw RequestError(error_code::bad_lines, message, std::move(details));
     }
     log_host_line(ov_log_info, "mgmtd", "loaded " + source);
     return {{"set", result.set}, {"removed", result.removed}};
@@ -244,13 +249,14 @@ json Requests::status(const json &)
                          {"events_sent", peer.events_sent},
                          {"bytes_waiting", peer.bytes_waiting}});
     }
+    const char *const model = get_config_name();
     const Candidate &candidate = configuration_.candidate();
     const auto uptime = std::chrono::duration_cast<std::chrono::seconds>(
         std::chrono::steady_clock::now() - started_);
     return {
         {"version", OVMD_VERSION},
         {"pid", ::getpid()},
-        {"model", daemon_.model.empty() ? json() : json(daemon_.model)},
+        {"model", model != nullptr ? json(model) : json()},
         {"commit", configuration_.commit_number()},
         {"nodes",
          {{"running", configuration_.running().size()}, {"candidate", candidate.tree().size()}}},

@@ -7,8 +7,8 @@
 
 #include <nlohmann/json_fwd.hpp>
 
+#include <chrono>
 #include <functional>
-#include <string>
 #include <vector>
 
 namespace ovhost
@@ -18,7 +18,6 @@ struct PeerStatus;
 
 /// What the handlers need to know of the daemon around them.
 struct DaemonView {
-    std::string model; ///< empty when none was named
     std::function<std::vector<PeerStatus>()> peers;
     /// Called before anything that may send events.
     std::function<void()> before_events;

@@ -1,5 +1,9 @@
 #include "host/modules/default_values.h"
 
+#include "framework/appliance.h"
+#include "framework/files.h"
+#include "host/modules/load_text.h"
+#include "host/modules/node_access.h"
 #include "orvale/md_db_default.h"
 
 #include <cstdlib>
@@ -55,23 +59,69 @@ int read_preserved(bn_str_value **values, uint32 *num_values, bn_str_value **rem
 
 struct FileSource {
     const char *name;
+    /// Where the library finds it; for the model, what the model's name is appended to.
+    const char *path;
     int (*read)(bn_str_value **, uint32 *, bn_str_value **, uint32 *);
-    bool must_be_whole;
+    bool is_model;
 };
 
 constexpr FileSource file_sources[] = {
-    {"model defaults", db_model_def_get_all, true},
-    {"debugging defaults", db_default_get_all, false},
-    {"preserved values", read_preserved, false},
+    {"model defaults", "/opt/orvale/defdb.conf.", db_model_def_get_all, true},
+    {"debugging defaults", "/var/opt/tms/.debug_default_db", db_default_get_all, false},
+    {"preserved values", "/var/opt/tms/.preserved_db", read_preserved, false},
 };
 
-void report_fault(const FileSource &source, const std::string &fault, const DefaultsReport &report)
+std::string path_of(const FileSource &source)
 {
-    if (source.must_be_whole) {
-        throw DefaultsError(std::string(source.name) + ": " + fault +
-                            "; mend the file and start again");
+    const char *const model = source.is_model ? get_config_name() : nullptr;
+    return std::string(source.path) + (model != nullptr ? model : "");
+}
+
+/// The lines of a file as the library reads them; none when it cannot be read.
+std::string read_lines(const std::string &path)
+{
+    tstr_array *read = nullptr;
+    (void)lf_read_file_lines(path.c_str(), &read);
+    const TstrArrayPtr lines(read);
+    const int32 count = read != nullptr ? tstr_array_length_quick(read) : 0;
+    std::string text;
+    for (int32 i = 0; i < count; ++i) {
+        text.append(tstr_array_get_str_quick(read, static_cast<uint32>(i))).append("\n");
     }
-    report.warning(std::string(source.name) + ": " + fault + "; left out");
+    return text;
+}
+
+/// Every line of a file that is no good, and why. The library logs a code for each of them and
+/// answers that of the last line alone, which neither finds a bad line in the middle nor tells its
+/// number.
+std::vector<std::string> find_faults(const std::string &path)
+{
+    Candidate scratch;
+    std::vector<std::string> faults;
+    for (const LineFault &fault : load_text(scratch, read_lines(path)).faults) {
+        faults.push_back("line " + std::to_string(fault.line) + ": " +
+                         (fault.node.empty() ? "" : fault.node + ": ") + fault.message);
+    }
+    return faults;
+}
+
+void report_faults(const FileSource &source, const std::vector<std::string> &faults,
+                   const DefaultsReport &report)
+{
+    const std::string path = path_of(source);
+    if (!source.is_model) {
+        for (const std::string &fault : faults) {
+            report.warning(path + ", " + fault + "; left out");
+        }
+        return;
+    }
+    if (!faults.empty()) {
+        std::string message = path + " has faults; mend it and start again";
+        for (const std::string &fault : faults) {
+            message += "\n  " + fault;
+        }
+        throw DefaultsError(message);
+    }
 }
 
 /// Values first: what a file removes is gone whatever else it says.
@@ -80,17 +130,18 @@ void apply_source(const FileSource &source, Candidate &candidate, const Defaults
     EntryArray values;
     EntryArray removals;
     const int err = source.read(&values.entries, &values.count, &removals.entries, &removals.count);
-    if (err != 0) {
-        report_fault(source, "a line cannot be read (error code " + std::to_string(err) + ")",
-                     report);
+    std::vector<std::string> faults;
+    if (err != 0 || values.count != 0 || removals.count != 0) {
+        faults = find_faults(path_of(source));
     }
+    if (err != 0 && faults.empty()) {
+        faults.push_back("the file cannot be read (error code " + std::to_string(err) + ")");
+    }
+    report_faults(source, faults, report);
     DefaultsSummary summary{source.name, 0, 0};
     for (const bn_str_value &value : values.view()) {
-        if (const auto fault = candidate.set(value.bv_name, value.bv_type, value.bv_value)) {
-            report_fault(source, *fault, report);
-        } else {
-            ++summary.set;
-        }
+        // A value that does not fit was among the faults.
+        summary.set += !candidate.set(value.bv_name, value.bv_type, value.bv_value).has_value();
     }
     for (const bn_str_value &removal : removals.view()) {
         // A node that is not there needs no removing.

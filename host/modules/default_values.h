@@ -34,8 +34,9 @@ struct DefaultsReport {
     std::function<void(const std::string &)> warning;
 };
 
-/// Applies all sources to the candidate. Throws DefaultsError when the model's file has a fault: an
-/// appliance with half of its model's defaults is worse than one that does not start.
+/// Applies all sources to the candidate. Throws DefaultsError, with every bad line, when the model's
+/// file has a fault: an appliance with half of its model's defaults is worse than one that does not
+/// start.
 void apply_default_values(Candidate &candidate, const DefaultsReport &report);
 
 /// Moves the preserved values aside. To be called once they are stored: until then the file is the

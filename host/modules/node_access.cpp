@@ -25,4 +25,13 @@ std::string type_name(bn_type type)
     return name != nullptr ? name : std::to_string(type);
 }
 
+std::optional<bn_type> find_type(const std::string &name)
+{
+    bn_type type = 0;
+    // The operation would take a NUL byte for the end of the name.
+    const bool found = name.find('\0') == std::string::npos &&
+                       lc_string_to_enum(bn_type_map, name.c_str(), &type) == 0;
+    return found ? std::optional(type) : std::nullopt;
+}
+
 } // namespace ovhost

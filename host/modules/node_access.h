@@ -5,6 +5,7 @@
 
 #include <cstdlib>
 #include <memory>
+#include <optional>
 #include <string>
 
 namespace ovhost
@@ -14,6 +15,11 @@ struct TstringDeleter {
     void operator()(tstring *text) const { ts_free(&text); }
 };
 using TstringPtr = std::unique_ptr<tstring, TstringDeleter>;
+
+struct TstrArrayDeleter {
+    void operator()(tstr_array *texts) const { tstr_array_free(&texts); }
+};
+using TstrArrayPtr = std::unique_ptr<tstr_array, TstrArrayDeleter>;
 
 struct BindingDeleter {
     void operator()(bn_binding *binding) const { bn_binding_free(&binding); }
@@ -33,5 +39,8 @@ using TextPtr = std::unique_ptr<char, TextDeleter>;
 
 /// The name of a type ("uint32"); its number when it has none.
 [[nodiscard]] std::string type_name(bn_type type);
+
+/// The type of a name; nothing when no type has it.
+[[nodiscard]] std::optional<bn_type> find_type(const std::string &name);
 
 } // namespace ovhost

@@ -1,6 +1,6 @@
-#include "host/mgmtd/load_text.h"
+#include "host/modules/load_text.h"
 
-#include "framework/errors.h"
+#include "host/modules/node_access.h"
 #include "host/tree/name.h"
 #include "orvale/ov_defdb_line.h"
 
@@ -16,13 +16,9 @@ std::string to_string(const ov_defdb_field &field)
     return {field.text, field.length};
 }
 
-/// The code of a type name, or what is wrong with it.
-std::optional<std::string> find_type(const std::string &name, bn_type &ret_type)
+std::string unknown_type(const ov_defdb_field &type)
 {
-    if (lc_string_to_enum(bn_type_map, name.c_str(), &ret_type) != 0) {
-        return "unknown type \"" + name + "\"";
-    }
-    return std::nullopt;
+    return "unknown type \"" + to_string(type) + "\"";
 }
 
 /// One entry line applied; answers what is wrong with it.
@@ -31,29 +27,32 @@ std::optional<std::string> apply_value(Candidate &candidate, const ov_defdb_fiel
     if (fields.name.length == 0 || fields.type.length == 0) {
         return "a value line needs a name and a type: NAME,TYPE,VALUE";
     }
-    bn_type type = 0;
-    if (auto fault = find_type(to_string(fields.type), type)) {
-        return fault;
+    const std::optional<bn_type> type = find_type(to_string(fields.type));
+    if (!type) {
+        return unknown_type(fields.type);
     }
-    return candidate.set(to_string(fields.name), type, to_string(fields.value));
+    return candidate.set(to_string(fields.name), *type, to_string(fields.value));
 }
 
 std::optional<std::string> apply_removal(Candidate &candidate, const ov_defdb_fields &fields)
 {
-    bn_type type = 0;
     if (fields.name.length == 0) {
         return "a removal line needs a name: -NAME";
     }
-    if (fields.type.length != 0) {
-        if (auto fault = find_type(to_string(fields.type), type)) {
-            return fault;
-        }
+    if (fields.type.length != 0 && !find_type(to_string(fields.type))) {
+        return unknown_type(fields.type);
     }
     const auto parts = split_name(to_string(fields.name));
     if (!parts || candidate.tree().exists(*parts)) {
         return candidate.erase(to_string(fields.name));
     }
     return std::nullopt;
+}
+
+/// A fault names its node beside the message, where some messages begin with it too.
+std::string without_name(std::string message, const std::string &name)
+{
+    return message.starts_with(name + ": ") ? message.substr(name.size() + 2) : message;
 }
 
 void apply_line(Candidate &candidate, const std::string &line, long number, LoadResult &result)
@@ -70,7 +69,8 @@ void apply_line(Candidate &candidate, const std::string &line, long number, Load
     const bool is_value = kind == ov_defdb_value;
     const ov_defdb_fields fields = ov_defdb_split(is_value ? start : start + 1);
     if (auto fault = is_value ? apply_value(candidate, fields) : apply_removal(candidate, fields)) {
-        result.faults.push_back({number, to_string(fields.name), *fault});
+        const std::string name = to_string(fields.name);
+        result.faults.push_back({number, name, without_name(*std::move(fault), name)});
         return;
     }
     ++(is_value ? result.set : result.removed);
