@@ -197,15 +197,9 @@ TEST_F(FaultLayer, RecordsLogLines)
 }
 
 #if OVTEST_ALLOCATION_LAYER
-void *allocate(std::size_t size)
-{
-    return std::malloc(size);
-}
-
-void release(void *block)
-{
-    std::free(block);
-}
+// Volatile: a compiler that sees malloc and free of an unused block leaves both out.
+void *(*volatile allocate)(std::size_t) = std::malloc;
+void (*volatile release)(void *) = std::free;
 
 TEST_F(FaultLayer, KeepsAccountOfMemory)
 {
