@@ -30,17 +30,22 @@ nlohmann::json to_json(const bn_request &request)
 class PeerSessions::Session : public gcl_session
 {
   public:
-    Session(ControlServer &server, std::string peer) : server_(server), peer_(std::move(peer))
-    {
-        register_session(peer_, *this);
-    }
-    ~Session() override { unregister_session(peer_, *this); }
+    Session(ControlServer &server, std::string peer) : server_(server), peer_(std::move(peer)) {}
+    ~Session() override { close(); }
     Session(const Session &) = delete;
     Session &operator=(const Session &) = delete;
 
+    void open() { register_session(peer_, *this); }
+    void close() { unregister_session(peer_, *this); }
+
     bool send(const bn_request &request) override
     {
-        return server_.send_to_peer(peer_, to_json(request));
+        const bool sent = server_.send_to_peer(peer_, to_json(request));
+        // The rest of a commit finds no peer, instead of failing once for each change.
+        if (!sent) {
+            close();
+        }
+        return sent;
     }
 
   private:
@@ -60,6 +65,7 @@ void PeerSessions::update()
         if (!session) {
             session = std::make_unique<Session>(server_, peer.name);
         }
+        session->open();
     }
 }
 
