@@ -162,6 +162,7 @@ TEST_F(Peer, ThatSleepsDoesNotHoldUpALargeCommit)
     // More than may wait for it: it was let go, and comes back when it wakes.
     EXPECT_FALSE(is_registered());
     EXPECT_THAT(log(), HasSubstr("peer jsond) was disconnected: does not read: "));
+    EXPECT_EQ(count(log(), "Cannot send event to jsond, err="), 1U) << "once for all that is lost";
     jsond->signal(SIGCONT);
     ASSERT_TRUE(eventually([this] { return is_registered(); })) << jsond->err();
     commit("/after", "string", "1");

@@ -114,6 +114,25 @@ TEST_F(PeerSessionsTest, TellsWhenThePeerHasGone)
         std::this_thread::yield();
     }
     EXPECT_FALSE(in_loop([&] { return found->send(event()); }));
+    EXPECT_EQ(in_loop([] { return find_session("jsond"); }), nullptr)
+        << "the rest of a commit finds nobody";
+}
+
+TEST_F(PeerSessionsTest, FindsAPeerThatCameBackAfterAFailedSend)
+{
+    auto first = join_as("jsond");
+    gcl_session *const found = session("jsond");
+    ASSERT_NE(found, nullptr);
+    first.reset();
+    while (in_loop([&] { return server_.has_peer("jsond"); })) {
+        std::this_thread::yield();
+    }
+    ASSERT_FALSE(in_loop([&] { return found->send(event()); }));
+    auto second = join_as("jsond");
+    gcl_session *const again = session("jsond");
+    ASSERT_NE(again, nullptr);
+    EXPECT_TRUE(in_loop([&] { return again->send(event()); }));
+    EXPECT_TRUE(second->read_event(std::chrono::seconds(10)));
 }
 
 TEST_F(PeerSessionsTest, SendsToThePeerThatCameBack)
