@@ -48,7 +48,7 @@ RecordOwner make_record(const Change &change, std::string name)
 {
     auto record = std::make_unique<OwnedRecord>();
     record->full_name.text = std::move(name);
-    record->parts.elements = change.parts;
+    record->parts = tstr_array(change.parts);
     record->mdc_name = &record->full_name;
     record->mdc_name_parts = &record->parts;
     record->mdc_change_type = kind_of(change);

@@ -65,7 +65,8 @@ int get_typed(const bn_binding *binding, uint32 attrib_id, bn_type type,
     return lc_err_no_error;
 }
 
-bool matches(std::span<const std::string> parts, const char *pattern)
+template <typename Text>
+bool matches(std::span<const Text> parts, const char *pattern)
 {
     const std::optional<NamePattern> parsed = NamePattern::parse(pattern);
     return parsed && parsed->matches(parts);
@@ -170,7 +171,7 @@ int bn_binding_name_to_parts(const char *name, tstr_array **ret, tbool /*flag*/)
     }
     return at_c_boundary([&]() -> int {
         std::optional<std::vector<std::string>> parts = split_name(name);
-        return parts ? hand_out(ret, tstr_array{*std::move(parts)}) : lc_err_bad_path;
+        return parts ? hand_out(ret, tstr_array(*parts)) : lc_err_bad_path;
     });
 }
 
@@ -182,7 +183,7 @@ tbool bn_binding_name_pattern_match(const char *name, const char *pattern)
     return at_c_boundary(
         [&] {
             const std::optional<std::vector<std::string>> parts = split_name(name);
-            return parts && matches(*parts, pattern);
+            return parts && matches(std::span<const std::string>(*parts), pattern);
         },
         false);
 }
@@ -193,7 +194,8 @@ tbool bn_binding_name_parts_pattern_match(const tstr_array *parts, tbool /*flag*
     if (parts == nullptr || pattern == nullptr) {
         return false;
     }
-    return at_c_boundary([&] { return matches(parts->elements, pattern); }, false);
+    return at_c_boundary(
+        [&] { return matches(std::span<const char *const>(parts->texts), pattern); }, false);
 }
 
 int bn_attrib_array_get_attrib_tstr(const bn_attrib_array *attribs, uint32 attrib_id, tstring **ret)

@@ -9,6 +9,7 @@
 #include <sys/stat.h>
 #include <unistd.h>
 
+#include <algorithm>
 #include <cerrno>
 #include <cstring>
 #include <memory>
@@ -48,52 +49,69 @@ bool says_absent(int error)
     return error == ENOENT || error == ENOTDIR;
 }
 
-/// Lines out of a file that arrives in blocks, each line copied once.
-class LineCollector
+constexpr std::size_t smallest_read = 65536;
+
+/// Fills the buffer from the file, as far as either goes; nothing when the file cannot be read.
+std::optional<std::size_t> read_up_to(int fd, char *buffer, std::size_t size)
 {
-  public:
-    void add_block(std::string_view block)
-    {
-        for (std::size_t end = block.find('\n'); end != std::string_view::npos;
-             end = block.find('\n')) {
-            begun_.append(block.substr(0, end));
-            lines_.push_back(std::move(begun_));
-            begun_.clear();
-            block.remove_prefix(end + 1);
-        }
-        begun_.append(block);
-    }
-
-    /// All lines; a last one without a line end counts when it is not empty.
-    std::vector<std::string> finish() &&
-    {
-        if (!begun_.empty()) {
-            lines_.push_back(std::move(begun_));
-        }
-        return std::move(lines_);
-    }
-
-  private:
-    std::vector<std::string> lines_;
-    std::string begun_;
-};
-
-/// All lines of an open file; nothing when it cannot be read.
-std::optional<std::vector<std::string>> read_lines(int fd)
-{
-    constexpr std::size_t block_size = std::size_t{256} * 1024;
-    const auto block = std::make_unique_for_overwrite<char[]>(block_size);
-    LineCollector collector;
-    for (;;) {
-        const ssize_t count = ::read(fd, block.get(), block_size);
+    std::size_t filled = 0;
+    while (filled < size) {
+        const ssize_t count = ::read(fd, buffer + filled, size - filled);
         if (count == 0) {
-            return std::move(collector).finish();
+            break;
         }
-        if (count > 0) {
-            collector.add_block({block.get(), static_cast<std::size_t>(count)});
-        } else if (errno != EINTR) {
+        if (count < 0 && errno != EINTR) {
             return std::nullopt;
         }
+        filled += count > 0 ? static_cast<std::size_t>(count) : 0;
+    }
+    return filled;
+}
+
+/// Adds the lines of a text that the array already holds: each line end becomes the end of a text.
+/// A last line without a line end counts when it is not empty.
+void add_lines(tstr_array &lines, char *text, std::size_t size)
+{
+    text[size] = '\n';
+    char *const end = text + size;
+    lines.texts.reserve(lines.texts.size() + static_cast<std::size_t>(std::count(text, end, '\n')) +
+                        1);
+    while (text < end) {
+        char *const line_end =
+            static_cast<char *>(std::memchr(text, '\n', static_cast<std::size_t>(end - text) + 1));
+        *line_end = '\0';
+        lines.texts.push_back(text);
+        text = line_end + 1;
+    }
+}
+
+/// All lines of an open file; nothing when it cannot be read. The size of one that is no regular
+/// file is not known before its end, and any file may grow meanwhile: then it takes further passes.
+std::optional<tstr_array> read_lines(int fd)
+{
+    struct stat status = {};
+    if (::fstat(fd, &status) != 0) {
+        return std::nullopt;
+    }
+    tstr_array lines;
+    // With room for one byte more than there is, one pass sees the end.
+    const std::size_t room = std::max(static_cast<std::size_t>(status.st_size), smallest_read) + 1;
+    for (std::string unfinished;;) {
+        char *const text = lines.claim(unfinished.size() + room + 1);
+        std::ranges::copy(unfinished, text);
+        const auto filled = read_up_to(fd, text + unfinished.size(), room);
+        if (!filled) {
+            return std::nullopt;
+        }
+        const std::size_t size = unfinished.size() + *filled;
+        if (*filled < room) {
+            add_lines(lines, text, size);
+            return lines;
+        }
+        const char *const last = static_cast<const char *>(::memrchr(text, '\n', size));
+        const std::size_t whole = last != nullptr ? static_cast<std::size_t>(last - text) + 1 : 0;
+        unfinished.assign(text + whole, size - whole);
+        add_lines(lines, text, whole);
     }
 }
 
@@ -148,8 +166,8 @@ int lf_read_file_lines(const char *path, tstr_array **ret)
         return says_absent(errno) ? lc_err_file_not_found : lc_err_io_error;
     }
     return at_c_boundary([&]() -> int {
-        std::optional<std::vector<std::string>> lines = read_lines(file.fd());
-        return lines ? ovhost::hand_out(ret, tstr_array{*std::move(lines)}) : lc_err_io_error;
+        std::optional<tstr_array> lines = read_lines(file.fd());
+        return lines ? ovhost::hand_out(ret, *std::move(lines)) : lc_err_io_error;
     });
 }
 

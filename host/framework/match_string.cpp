@@ -199,8 +199,8 @@ int ov_acl_validate_matchstr(const char *matchstr, tstr_array **keys, tstr_array
             }
             return lc_err_parse_error;
         }
-        auto key_list = std::make_unique<tstr_array>(tstr_array{std::move(match.keys)});
-        auto value_list = std::make_unique<tstr_array>(tstr_array{std::move(match.values)});
+        auto key_list = std::make_unique<tstr_array>(match.keys);
+        auto value_list = std::make_unique<tstr_array>(match.values);
         *keys = key_list.release();
         *values = value_list.release();
         return lc_err_no_error;

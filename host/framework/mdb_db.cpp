@@ -124,7 +124,7 @@ int mdb_get_tstr_array(md_commit * /*commit*/, const mdb_db *db, const char *par
                        tstr_array **ret)
 {
     return query(db, parent, ret, [&](Tree::Parts parts) {
-        return hand_out(ret, tstr_array{db->tree.children(parts)});
+        return hand_out(ret, tstr_array(db->tree.children(parts)));
     });
 }
 
@@ -135,7 +135,7 @@ int mdb_get_matching_tstr_array(md_commit * /*commit*/, const mdb_db *db, const 
     // stands for whole names.
     return query(db, pattern, ret, [&](Tree::Parts /*parts*/) -> int {
         const std::optional<NamePattern> parsed = NamePattern::parse(pattern);
-        return parsed ? hand_out(ret, tstr_array{db->tree.matching(*parsed)}) : lc_err_bad_path;
+        return parsed ? hand_out(ret, tstr_array(db->tree.matching(*parsed))) : lc_err_bad_path;
     });
 }
 

@@ -14,18 +14,35 @@
 
 #include <map>
 #include <memory>
+#include <memory_resource>
+#include <span>
 #include <string>
+#include <string_view>
 #include <vector>
 
 struct tstring {
     std::string text;
 };
 
+/// The texts lie in blocks that go with the array, so that the lines of a file need no allocation
+/// each. A text that leaves the array leaves its bytes behind until then.
 struct tstr_array {
+    tstr_array() = default;
+    explicit tstr_array(std::span<const std::string> texts);
+
+    /// Room for text of the array's own, which the caller fills before anything else is added.
+    char *claim(std::size_t size);
+
+    /// Adds a copy at the end.
+    void append(std::string_view text);
+
     // A null entry never occurs; every access goes through a valid element.
-    std::vector<std::string> elements;
+    std::vector<const char *> texts;
     // Of the options only the duplicate policy is looked at; zero is adp_add.
     array_options options = {};
+
+  private:
+    std::unique_ptr<std::pmr::monotonic_buffer_resource> blocks_;
 };
 
 struct uint32_array {

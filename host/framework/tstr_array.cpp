@@ -13,24 +13,44 @@ namespace
 using ovhost::at_c_boundary;
 using ovhost::hand_out;
 
-/// Adds a text at the end as the array's duplicate policy wants it. The text is taken only when
-/// nothing can fail any more, so that on failure the caller still has it.
-void append(tstr_array &arr, std::string &text)
+/// Adds a text at the end as the array's duplicate policy wants it.
+void append_by_policy(tstr_array &arr, std::string_view text)
 {
-    auto &elements = arr.elements;
     if (arr.options.ao_dup_policy != adp_add) {
-        const auto present = std::ranges::find(elements, text);
-        if (present != elements.end()) {
+        const auto present = std::ranges::find(arr.texts, text);
+        if (present != arr.texts.end()) {
             if (arr.options.ao_dup_policy == adp_delete_old) {
-                std::rotate(present, present + 1, elements.end());
+                std::rotate(present, present + 1, arr.texts.end());
             }
             return;
         }
     }
-    elements.push_back(std::move(text));
+    arr.append(text);
 }
 
 } // namespace
+
+tstr_array::tstr_array(std::span<const std::string> from)
+{
+    texts.reserve(from.size());
+    std::ranges::for_each(from, [this](const std::string &text) { append(text); });
+}
+
+char *tstr_array::claim(std::size_t size)
+{
+    if (!blocks_) {
+        blocks_ = std::make_unique<std::pmr::monotonic_buffer_resource>();
+    }
+    return static_cast<char *>(blocks_->allocate(size, 1));
+}
+
+void tstr_array::append(std::string_view text)
+{
+    // A text ends at its first NUL for everybody who reads it, so it may end there at once.
+    char *const copy = claim(text.size() + 1);
+    *std::ranges::copy(text, copy).out = '\0';
+    texts.push_back(copy);
+}
 
 int tstr_array_new(tstr_array **ret, const tstr_array_options *opts)
 {
@@ -39,7 +59,9 @@ int tstr_array_new(tstr_array **ret, const tstr_array_options *opts)
     }
     *ret = nullptr;
     return at_c_boundary([&] {
-        return hand_out(ret, tstr_array{{}, opts == nullptr ? tstr_array_options{} : *opts});
+        tstr_array made;
+        made.options = opts == nullptr ? tstr_array_options{} : *opts;
+        return hand_out(ret, std::move(made));
     });
 }
 
@@ -50,12 +72,12 @@ void tstr_array_free(tstr_array **arr)
 
 int32 tstr_array_length_quick(const tstr_array *arr)
 {
-    return static_cast<int32>(arr->elements.size());
+    return static_cast<int32>(arr->texts.size());
 }
 
 const char *tstr_array_get_str_quick(const tstr_array *arr, uint32 index)
 {
-    return arr->elements[index].c_str();
+    return arr->texts[index];
 }
 
 int tstr_array_append_str(tstr_array *arr, const char *text)
@@ -64,8 +86,7 @@ int tstr_array_append_str(tstr_array *arr, const char *text)
         return lc_err_unexpected_null;
     }
     return at_c_boundary([&]() -> int {
-        std::string copy = text;
-        append(*arr, copy);
+        append_by_policy(*arr, text);
         return lc_err_no_error;
     });
 }
@@ -76,7 +97,7 @@ int tstr_array_append_takeover(tstr_array *arr, tstring **str)
         return lc_err_unexpected_null;
     }
     return at_c_boundary([&]() -> int {
-        append(*arr, (*str)->text);
+        append_by_policy(*arr, (*str)->text);
         ovhost::release(str);
         return lc_err_no_error;
     });
@@ -90,16 +111,15 @@ int tstr_array_remove(tstr_array *arr, uint32 index, tstring **ret)
     if (arr == nullptr) {
         return lc_err_unexpected_null;
     }
-    if (index >= arr->elements.size()) {
+    if (index >= arr->texts.size()) {
         return lc_err_not_found;
     }
     return at_c_boundary([&]() -> int {
-        const auto element = arr->elements.begin() + index;
+        const auto element = arr->texts.begin() + index;
         if (ret != nullptr) {
-            *ret = new tstring;
-            (*ret)->text = std::move(*element);
+            *ret = new tstring{*element};
         }
-        arr->elements.erase(element);
+        arr->texts.erase(element);
         return lc_err_no_error;
     });
 }
@@ -113,5 +133,11 @@ int tstr_array_duplicate(const tstr_array *arr, tstr_array **ret)
     if (arr == nullptr) {
         return lc_err_no_error;
     }
-    return at_c_boundary([&] { return hand_out(ret, tstr_array(*arr)); });
+    return at_c_boundary([&] {
+        tstr_array copy;
+        copy.options = arr->options;
+        copy.texts.reserve(arr->texts.size());
+        std::ranges::for_each(arr->texts, [&copy](const char *text) { copy.append(text); });
+        return hand_out(ret, std::move(copy));
+    });
 }

@@ -12,6 +12,11 @@ namespace
 
 constexpr std::string_view wildcard = "*";
 
+bool stands_for(const NamePattern::Part &part, std::string_view component)
+{
+    return !part || *part == component;
+}
+
 struct Component {
     std::string text;
     /// Whether the component held an escape: "\*" and "*" are one text but two patterns.
@@ -172,9 +177,12 @@ std::optional<NamePattern> NamePattern::parse(std::string_view pattern)
 
 bool NamePattern::matches(std::span<const std::string> name) const
 {
-    return std::ranges::equal(parts_, name, [](const Part &part, const std::string &component) {
-        return !part || *part == component;
-    });
+    return std::ranges::equal(parts_, name, stands_for);
+}
+
+bool NamePattern::matches(std::span<const char *const> name) const
+{
+    return std::ranges::equal(parts_, name, stands_for);
 }
 
 } // namespace ovhost

@@ -53,6 +53,7 @@ class NamePattern
     [[nodiscard]] static std::optional<NamePattern> parse(std::string_view pattern);
 
     [[nodiscard]] bool matches(std::span<const std::string> name) const;
+    [[nodiscard]] bool matches(std::span<const char *const> name) const;
 
     [[nodiscard]] std::span<const Part> parts() const { return parts_; }
 
