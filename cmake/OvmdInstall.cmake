@@ -18,5 +18,7 @@ write_basic_package_version_file(${package_build_dir}/ovmd-config-version.cmake
 install(FILES ${package_build_dir}/ovmd-config.cmake ${package_build_dir}/ovmd-config-version.cmake
   DESTINATION ${package_dir})
 
+# Told from where the file stands, so that an installed tree can be moved.
+file(RELATIVE_PATH prefix_from_pkgconfig /${CMAKE_INSTALL_LIBDIR}/pkgconfig /)
 configure_file(${PROJECT_SOURCE_DIR}/cmake/ovmd.pc.in ${package_build_dir}/ovmd.pc @ONLY)
 install(FILES ${package_build_dir}/ovmd.pc DESTINATION ${CMAKE_INSTALL_LIBDIR}/pkgconfig)

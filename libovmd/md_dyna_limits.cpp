@@ -88,6 +88,7 @@ int read_limit(const mdb_db *db, const char *node, uint32 &ret_limit)
 
 int write_dyna_limits_conf(const mdb_db *new_db)
 {
+    BAIL_NULL(new_db);
     if (ov_system_info.initialized == 0) {
         BAIL_ERROR(init_model_info(new_db));
     }

@@ -24,9 +24,9 @@ OV_C_BEGIN
  * writing fails the file is removed: no file with fewer than six lines stays behind.
  *
  * new_db  the database to read; during a commit, the one that will be in force after it
- * Returns 0; 14001 when the file cannot be created; 14014 when it cannot be written to its end; the
- * code of init_model_info, or of reading a node or its value. The file of an earlier call stays
- * only when init_model_info failed, before the file was touched.
+ * Returns 0; 14001 when new_db is null or the file cannot be created; 14014 when it cannot be
+ * written to its end; the code of init_model_info, or of reading a node or its value. The file of
+ * an earlier call stays only when init_model_info failed, before the file was touched.
  */
 OV_NODISCARD OV_API int write_dyna_limits_conf(const mdb_db *new_db);
 

@@ -5,7 +5,6 @@
 #include <gmock/gmock.h>
 
 #include <algorithm>
-#include <chrono>
 #include <random>
 #include <set>
 
@@ -173,31 +172,6 @@ TEST(DiffModel, AgreesWithComparingEveryNode)
             versions.push_back(std::move(next));
         }
     }
-}
-
-TEST(Diff, CostFollowsTheChangeNotTheTree)
-{
-    // Counted in time because nothing else is visible from outside; the margin is a factor of
-    // hundreds, so that a loaded machine does not matter.
-    Tree before;
-    for (int parent = 0; parent < 10; ++parent) {
-        for (int child = 0; child < 5000; ++child) {
-            before.set(Parts{"p" + std::to_string(parent), std::to_string(child)}, text("x"));
-        }
-    }
-    Tree after = before;
-    after.set(Parts{"p7", "2500"}, text("y"));
-    const auto duration_of = [](const auto &work) {
-        const auto start = std::chrono::steady_clock::now();
-        work();
-        return std::chrono::steady_clock::now() - start;
-    };
-    std::vector<Change> changes;
-    const auto shared = duration_of([&] { changes = diff(before, after); });
-    EXPECT_THAT(changes, ElementsAre(change("/p7/2500", text("x"), text("y"))));
-    const auto whole = duration_of([&] { changes = diff(Tree(), before); });
-    EXPECT_EQ(changes.size(), 50000U);
-    EXPECT_LT(shared * 20, whole);
 }
 
 } // namespace
