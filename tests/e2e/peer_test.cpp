@@ -6,6 +6,7 @@
 
 #include <algorithm>
 #include <csignal>
+#include <filesystem>
 
 namespace
 {
@@ -25,17 +26,28 @@ std::size_t count(const std::string &text, const std::string &part)
     return found;
 }
 
-class Peer : public E2eTest
+class PeerTest : public E2eTest
 {
   protected:
-    Peer() { start(); }
-
     std::string status() const { return ovctl({"status"}).out; }
 
     bool is_registered() const
     {
         return status().find("peer                jsond") != std::string::npos;
     }
+};
+
+class Peer : public PeerTest
+{
+  protected:
+    Peer() { start(); }
+};
+
+/// Commits so large that a line in the log for each change would be most of the work.
+class PeerOfLargeCommit : public PeerTest
+{
+  protected:
+    PeerOfLargeCommit() { start_quietly("warning"); }
 
     /// Commits 20,000 new nodes, /x/1 and so on, whose events make more than may wait for a peer.
     void commit_many() const
@@ -153,7 +165,7 @@ TEST_F(Peer, ThatSleepsGetsAFewEventsWhenItWakes)
                                              event_line("modify", "/x", "3", "2")));
 }
 
-TEST_F(Peer, ThatSleepsDoesNotHoldUpALargeCommit)
+TEST_F(PeerOfLargeCommit, DoesNotHoldItUpWhenItSleeps)
 {
     auto jsond = start_jsond({"--retry"});
     jsond->signal(SIGSTOP);
@@ -172,16 +184,17 @@ TEST_F(Peer, ThatSleepsDoesNotHoldUpALargeCommit)
     }));
 }
 
-TEST_F(Peer, ThatReadsLosesNothingOfALargeCommit)
+TEST_F(PeerOfLargeCommit, LosesNothingWhenItReads)
 {
     auto jsond = start_jsond();
     commit_many();
-    const auto lines = await_events(20000);
-    ASSERT_EQ(lines.size(), 20000U) << log_lines(log()).back();
+    std::string expected;
     for (unsigned i = 1; i <= 20000; ++i) {
-        const std::string number = std::to_string(i);
-        ASSERT_EQ(lines[i - 1], event_line("add", "/x/" + number, value_of(i).c_str(), nullptr));
+        const std::string name = "/x/" + std::to_string(i);
+        expected += event_line("add", name, value_of(i).c_str(), nullptr) + "\n";
     }
+    EXPECT_TRUE(eventually([&] { return std::filesystem::file_size(events_) >= expected.size(); }));
+    EXPECT_TRUE(read_file(events_) == expected);
     EXPECT_TRUE(is_registered());
     EXPECT_THAT(log(), Not(HasSubstr("disconnected: ")));
 }
