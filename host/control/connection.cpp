@@ -162,9 +162,9 @@ bool Connection::send_event(std::string_view line)
         return false;
     if (waiting() > 0)
         flush();
-    if (!over_ && waiting() > 0 && waiting() + line.size() > limits_.max_waiting)
+    if (!over_ && waiting() > 0 && waiting() + line.size() > limits_.max_events_waiting)
         end("does not read: " + std::to_string(waiting()) + " bytes wait for it, " +
-            std::to_string(limits_.max_waiting) + " may");
+            std::to_string(limits_.max_events_waiting) + " may");
     send(line);
     return !over_;
 }

@@ -20,8 +20,12 @@ struct ServerLimits {
     /// Longest request line, in bytes.
     std::size_t max_request = 16UL << 20;
     /// How many bytes may wait for one client. A client over it is served no further requests until
-    /// it has read some answers; a peer is disconnected when an event would take it over.
+    /// it has read some answers.
     std::size_t max_waiting = 8UL << 20;
+    /// How many bytes may wait for a peer before an event is added: one that would go past it
+    /// disconnects the peer. Large enough that a peer which merely runs later than the daemon does
+    /// not lose the events of a large commit.
+    std::size_t max_events_waiting = 64UL << 20;
     std::size_t max_clients = 512;
     /// A client that has not taken one waiting byte for so long is disconnected.
     std::chrono::milliseconds stall_timeout{30000};

@@ -52,7 +52,8 @@ UniqueFd lock_directory_of(const std::string &path)
         directory = ".";
     UniqueFd fd(::open(directory.c_str(), O_RDONLY | O_DIRECTORY | O_CLOEXEC));
     if (!fd)
-        fail_with_errno(path, "directory " + directory + ": ");
+        fail(path, "directory " + directory + ": " + std::strerror(errno) +
+                       ": make it, or choose another --socket");
 
     constexpr int tries = 40;
     constexpr std::chrono::milliseconds pause(50);

@@ -42,7 +42,9 @@ void run(const DaemonOptions &options)
                                       [&sessions] { sessions->update(); }});
     EventLoop loop;
     loop.stop_on_signals();
-    ControlServer server(loop, options.socket, {}, requests, log_control_line);
+    ServerLimits limits;
+    limits.max_events_waiting = std::size_t{options.peer_buffer_mib} << 20;
+    ControlServer server(loop, options.socket, limits, requests, log_control_line);
     server_view = &server;
     sessions.emplace(server);
 

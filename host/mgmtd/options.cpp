@@ -42,6 +42,10 @@ std::optional<DaemonOptions> parse_options(int argc, char **argv, int &ret_exit_
                    "Model of the appliance: names its default file, defdb.conf.MODEL");
     app.add_option("--root", options.root,
                    "Run in a private mount namespace with /opt/orvale and /var/opt/tms below DIR");
+    app.add_option("--peer-buffer", options.peer_buffer_mib,
+                   "MiB of events that may wait for a peer before it is disconnected")
+        ->check(CLI::Range(1, 4096))
+        ->capture_default_str();
     add_level(app, "--log-level", options.log_level, "Lines up to this level are logged (notice)");
     add_level(app, "--module-log-level", options.module_log_level,
               "Level at which the library's interface count manager logs (info)");

@@ -15,6 +15,7 @@ struct DaemonOptions {
     std::filesystem::path root; ///< empty: the machine's own paths
     int log_level = 5;
     int module_log_level = 6;
+    unsigned peer_buffer_mib = 64;
 };
 
 /// Reads the command line. Nothing when the process is to end with `ret_exit_code`: help was asked

@@ -124,9 +124,24 @@ void report_faults(const FileSource &source, const std::vector<std::string> &fau
     }
 }
 
+/// The library takes a model's file that is missing, or may not be used, for one without values. To
+/// a daemon that was told its model it is a fault: the store would begin with half the appliance.
+void check_model_file(const FileSource &source)
+{
+    if (!source.is_model || get_config_name() == nullptr) {
+        return;
+    }
+    const std::string path = path_of(source);
+    if (!conf_file_okay(path.c_str())) {
+        throw DefaultsError("the model's default file " + path +
+                            " cannot be used (the log says why); mend it or name another --model");
+    }
+}
+
 /// Values first: what a file removes is gone whatever else it says.
 void apply_source(const FileSource &source, Candidate &candidate, const DefaultsReport &report)
 {
+    check_model_file(source);
     EntryArray values;
     EntryArray removals;
     const int err = source.read(&values.entries, &values.count, &removals.entries, &removals.count);

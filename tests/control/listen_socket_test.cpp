@@ -131,7 +131,9 @@ TEST_F(ListenSocketTest, AFolderThatIsNotThereIsNamed)
 {
     const std::string folder = dir_.path("missing");
     EXPECT_EQ(create(folder + "/socket"), "cannot create socket " + folder + "/socket: directory " +
-                                              folder + ": No such file or directory");
+                                              folder +
+                                              ": No such file or directory: make it, or choose "
+                                              "another --socket");
 }
 
 TEST_F(ListenSocketTest, APathCanBeTooLong)

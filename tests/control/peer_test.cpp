@@ -142,7 +142,7 @@ TEST(PeerTest, NamesAreChecked)
 
 TEST(PeerTest, APeerThatDoesNotReadIsLetGoAndBlocksNobody)
 {
-    TestServer server({}, {.max_waiting = 1000000});
+    TestServer server({}, {.max_events_waiting = 1000000});
     RawClient peer(server.path());
     register_as_jsond(peer);
     RawClient other(server.path());
@@ -189,7 +189,7 @@ TEST(PeerTest, APeerThatReadsGetsAnyNumberOfEvents)
 
 TEST(PeerTest, OneEventMayBeLargerThanWhatMayWait)
 {
-    TestServer server({}, {.max_waiting = 1000});
+    TestServer server({}, {.max_events_waiting = 1000});
     RawClient peer(server.path());
     register_as_jsond(peer);
     const std::string large(2000000, 'e');
@@ -220,7 +220,7 @@ TEST(PeerTest, APeerLetGoDuringItsOwnRequestDoesNoHarm)
                 continue;
             return 1;
         },
-        {.max_waiting = 50000});
+        {.max_events_waiting = 50000});
     running = &server;
     RawClient peer(server.path());
     register_as_jsond(peer);

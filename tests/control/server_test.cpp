@@ -200,6 +200,10 @@ class OneMoreDescriptor
 TEST(ServerTest, AClientIsTakenOnceThereAreDescriptorsAgain)
 {
     TestServer server;
+    // The server's thread is running from here on: its start may need a descriptor of its own.
+    RawClient early(server.path());
+    early.send(echo_line(1, "early"));
+    ASSERT_EQ(early.line(), echo_answer(1, "early"));
     std::unique_ptr<RawClient> client;
     {
         const OneMoreDescriptor limit;

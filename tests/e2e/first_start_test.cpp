@@ -55,14 +55,20 @@ class FirstStart : public E2eTest
 
     std::string mode() const { return ovctl({"get", "/ov/tunneld/system/config/mode"}).out; }
 
-    /// The daemon started with the model, wrote nothing of it and says why in its log.
-    void expect_start_without_model(const std::string &reason)
+    /// The daemon does not start with the model and says why; without it, it does.
+    void expect_unusable_model(const std::string &reason)
     {
-        start({"--model", "branch-100"});
+        const Outcome outcome = run_daemon({"--model", "branch-100"});
+        EXPECT_EQ(outcome.exit_code, 1);
+        EXPECT_THAT(outcome.err,
+                    HasSubstr("configuration file /opt/orvale/defdb.conf.branch-100 is not used: " +
+                              reason + "\n"));
+        EXPECT_THAT(outcome.err,
+                    HasSubstr("\nmgmtd: the model's default file /opt/orvale/defdb.conf.branch-100 "
+                              "cannot be used (the log says why); mend it or name another "
+                              "--model\n"));
+        start({});
         EXPECT_EQ(mode(), "/ov/tunneld/system/config/mode string bridge\n");
-        EXPECT_THAT(log_lines(log()), Contains("notice files -: configuration file "
-                                               "/opt/orvale/defdb.conf.branch-100 is not used: " +
-                                               reason));
     }
 };
 
@@ -116,22 +122,22 @@ TEST_F(FirstStart, NeedsNoFiles)
     EXPECT_THAT(lines_of(ovctl({"status"}).out), Contains("model               none"));
 }
 
-TEST_F(FirstStart, GoesOnWithoutAMissingModelFile)
+TEST_F(FirstStart, EndsOnAMissingModelFile)
 {
-    expect_start_without_model("it cannot be opened: No such file or directory");
+    expect_unusable_model("it cannot be opened: No such file or directory");
 }
 
 TEST_F(FirstStart, DoesNotReadADirectoryForAModelFile)
 {
     fs::create_directories(model_file());
-    expect_start_without_model("it is not a regular file");
+    expect_unusable_model("it is not a regular file");
 }
 
 TEST_F(FirstStart, DoesNotTrustAModelFileThatEverybodyMayWrite)
 {
     install_samples();
     ASSERT_EQ(::chmod(model_file().c_str(), 0666), 0);
-    expect_start_without_model("everybody may write to it; take that right away with chmod o-w");
+    expect_unusable_model("everybody may write to it; take that right away with chmod o-w");
 }
 
 TEST_F(FirstStart, EndsOnABadModelFileAndStoresNothing)

@@ -114,9 +114,11 @@ void E2eTest::start(const Words &more)
         << log();
 }
 
-void E2eTest::start_quietly(const std::string &log_level)
+void E2eTest::start_quietly(const std::string &log_level, const Words &more)
 {
-    daemon_ = std::make_unique<Process>(daemon_words({"--log-level", log_level}));
+    Words words{"--log-level", log_level};
+    words.insert(words.end(), more.begin(), more.end());
+    daemon_ = std::make_unique<Process>(daemon_words(words));
     ASSERT_TRUE(eventually([this] { return ovctl({"status"}).exit_code == 0; })) << log();
 }
 

@@ -84,7 +84,7 @@ class E2eTest : public testing::Test
     void start(const Words &more = {});
 
     /// The same for a daemon whose log does not say that it is ready.
-    void start_quietly(const std::string &log_level);
+    void start_quietly(const std::string &log_level, const Words &more = {});
 
     /// Runs a daemon that is to end by itself.
     [[nodiscard]] Outcome run_daemon(const Words &more = {}) const

@@ -153,7 +153,8 @@ TEST_F(Lifecycle, NeedsTheDirectoryOfItsSocket)
     EXPECT_EQ(run({E2E_MGMTD, "--root", root_, "--state-dir", state_, "--socket", socket}),
               (Outcome{1, "",
                        "mgmtd: cannot create socket " + socket + ": directory " +
-                           (dir_ / "none").string() + ": No such file or directory\n"}));
+                           (dir_ / "none").string() +
+                           ": No such file or directory: make it, or choose another --socket\n"}));
 }
 
 TEST_F(Lifecycle, NeedsARootThatIsThere)

@@ -47,7 +47,7 @@ class Peer : public PeerTest
 class PeerOfLargeCommit : public PeerTest
 {
   protected:
-    PeerOfLargeCommit() { start_quietly("warning"); }
+    PeerOfLargeCommit() { start_quietly("warning", {"--peer-buffer", "8"}); }
 
     /// Commits 20,000 new nodes, /x/1 and so on, whose events make more than may wait for a peer.
     void commit_many() const
