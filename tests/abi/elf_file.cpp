@@ -168,7 +168,8 @@ std::vector<DynamicSymbol> ElfFile::symbols() const
         }
         const Version &version = versions.at(version_indices[i] & version_index_mask);
         symbols.push_back({text(strings_of(section), row.st_name), version.name, version.library,
-                           row.st_shndx != SHN_UNDEF, ELF64_ST_BIND(row.st_info) == STB_WEAK});
+                           row.st_shndx != SHN_UNDEF, ELF64_ST_BIND(row.st_info) == STB_WEAK,
+                           static_cast<unsigned char>(ELF64_ST_TYPE(row.st_info)), row.st_size});
     }
     return symbols;
 }

@@ -17,6 +17,8 @@ struct DynamicSymbol {
     std::string library; // where an undefined symbol's version is expected
     bool defined = false;
     bool weak = false;
+    unsigned char type = STT_NOTYPE;
+    Elf64_Xword size = 0;
 };
 
 class ElfFile

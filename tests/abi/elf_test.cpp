@@ -51,6 +51,21 @@ TEST_F(LibraryFile, ExportsTheListedSymbolsAndNoOthers)
     EXPECT_EQ(exported, names_in(OVTEST_EXPORTED_SYMBOLS));
 }
 
+TEST_F(LibraryFile, ExportsFunctionsAndTheTwoTables)
+{
+    constexpr Elf64_Xword table_size = 65536 * 32;
+    Names tables;
+    for (const DynamicSymbol &symbol : elf_.symbols()) {
+        if (symbol.defined && symbol.type == STT_OBJECT) {
+            tables.insert(symbol.name);
+            EXPECT_EQ(symbol.size, table_size) << symbol.name;
+        } else if (symbol.defined) {
+            EXPECT_EQ(symbol.type, STT_FUNC) << symbol.name;
+        }
+    }
+    EXPECT_THAT(tables, ElementsAre("tunalias_assoc", "tunname_assoc"));
+}
+
 TEST_F(LibraryFile, ExportsThemInOneVersion)
 {
     for (const DynamicSymbol &symbol : elf_.symbols()) {

@@ -15,8 +15,11 @@
 #include "framework/tstr_array.h"
 #include "framework/typed_arrays.h"
 #include "orvale/md_db_default.h"
+#include "orvale/md_tunbin_ht.h"
+#include "orvale/md_tunneld_defs.h"
 
 #include <assert.h>
+#include <stdalign.h>
 
 #define SIZE_IS(type, size) static_assert(sizeof(type) == (size), #type " is " #size " bytes wide")
 #define OFFSET_IS(type, member, offset)                                                            \
@@ -64,6 +67,21 @@ OFFSET_IS(bn_str_value, bv_name, 0);
 OFFSET_IS(bn_str_value, bv_type, 8);
 OFFSET_IS(bn_str_value, bv_value, 16);
 
+SIZE_IS(tunnel_config_bin_t, 328);
+OFFSET_IS(tunnel_config_bin_t, tp_tunnel_name, 0);
+OFFSET_IS(tunnel_config_bin_t, tp_tunnel_alias, 65);
+OFFSET_IS(tunnel_config_bin_t, tp_tunnel_id, 324);
+
+SIZE_IS(okv_key, 16);
+SIZE_IS(okv_assoc_entry, 32);
+SIZE_IS(okv_assoc_entry_type, 32);
+VALUE_IS(alignof(okv_assoc_entry), 16);
+OFFSET_IS(okv_assoc_entry, key, 0);
+OFFSET_IS(okv_assoc_entry, value, 16);
+OFFSET_IS(okv_assoc_entry, count, 20);
+SIZE_IS(tunname_assoc, 2097152);
+SIZE_IS(tunalias_assoc, 2097152);
+
 VALUE_IS(sizeof lc_error_code_map / sizeof lc_error_code_map[0], 40);
 VALUE_IS(sizeof bn_type_map / sizeof bn_type_map[0], 45);
 
@@ -95,6 +113,13 @@ VALUE_IS(lc_err_file_not_found, 14013);
 VALUE_IS(lc_err_io_error, 14014);
 VALUE_IS(lc_err_bad_type, 14020);
 VALUE_IS(lc_err_cancelled, 14120);
+VALUE_IS(OKV_ASSOC_SIZE, 65536);
+VALUE_IS(OKV_INVALID_VALUE, 65535);
+VALUE_IS(TUNBIN_HT_COLLISION, 65534);
+VALUE_IS(MD_TUNBIN_HT_SIZE, 10022);
+VALUE_IS(TUNNEL_ID_NONE, 65535);
+VALUE_IS(TUNNEL_ID_RESERVE, 20);
+VALUE_IS(TUNNEL_ID_QUARANTINE_MS, 60000);
 VALUE_IS(ov_log_error, 3);
 VALUE_IS(ov_log_warning, 4);
 VALUE_IS(ov_log_notice, 5);

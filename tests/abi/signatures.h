@@ -15,6 +15,7 @@
 #include "orvale/md_db_default.h"
 #include "orvale/md_dyna_limits.h"
 #include "orvale/md_event_common.h"
+#include "orvale/md_tunbin_ht.h"
 #include "orvale/md_tunneld_tunnel_common.h"
 
 OV_C_BEGIN
@@ -132,6 +133,35 @@ int db_preserved_get_all(bn_str_value **, uint32 *, bn_str_value **, uint32 *,
 int db_default_set_all(bn_str_value *, uint32 *);
 int bn_str_value_free(bn_str_value **, uint32);
 int write_dyna_limits_conf(const mdb_db *);
+int md_init_tunnel_id(void);
+int md_get_next_n_available_tunnel_ids(uint32, uint32_array *);
+int md_set_tunnel_id(uint32 id, const tstring *);
+int md_free_tunnel_id(const tstring *);
+int md_get_tunnel_id(const tstring *, uint32 *);
+int md_get_tunnel_id_sorted(tstring *, uint32 *);
+int md_get_tunnel_name_str_sorted(uint32, const char **);
+int md_get_total_tunnels(void);
+int tunnel_sorted_seq_compare(const void *, const void *);
+int md_tunbin_ht_init(void);
+int md_tunbin_ht_add(const void *);
+int md_tunbin_ht_del(const void *);
+tbool md_tunbin_ht_id_has_tunnel(uint32);
+const char *md_tunbin_ht_get_name_by_id(uint32);
+uint32 md_tunbin_ht_get_id_by_name(const char *);
+uint32 md_tunbin_ht_get_id_by_alias(const char *);
+void md_tunbin_ht_dump(void);
+int tunbin_tunname_ht_init(void);
+void tunbin_tunname_ht_add(char *, uint32);
+void tunbin_tunname_ht_del(char *);
+int tunbin_tunname_ht_find(const char *, uint32 *);
+uint32 tunbin_tunname_ht_dump(void);
+int tunbin_tunalias_ht_init(void);
+void tunbin_tunalias_ht_add(char *, uint32);
+void tunbin_tunalias_ht_del(char *);
+int tunbin_tunalias_ht_find(const char *, uint32 *);
+uint32 tunbin_tunalias_ht_dump(void);
+extern okv_assoc_entry tunname_assoc[65536];
+extern okv_assoc_entry tunalias_assoc[65536];
 void md_send_dbc_event(const char *, const char *, const char *);
 void md_send_dbc_event2(const char *, const char *, const char *, const char *);
 

@@ -110,7 +110,8 @@ struct FaultRow {
     void (*set_up)(HostFixture &);
     std::string (*call)(HostFixture &);
     Outcome without_fault;
-    std::vector<FailureRow> failures; // the first that fits counts
+    std::vector<FailureRow> failures = {}; // the first that fits counts
+    void (*clean_up)() = nullptr;          // releases what the library keeps from call to call
 };
 
 // How GoogleTest shows a row.

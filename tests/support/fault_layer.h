@@ -9,6 +9,7 @@
 
 #include "tests/support/host_operations.h"
 
+#include <optional>
 #include <string>
 #include <type_traits>
 #include <vector>
@@ -37,8 +38,22 @@ void disarm();
 // Whether the armed fault has made a call fail.
 bool fault_struck();
 
-// Forgets everything that was counted, recorded or armed.
+// Forgets everything that was counted, recorded, armed or planted.
 void reset_fault_layer();
+
+// Forgets the calls and log lines counted and recorded so far, but not the objects.
+void forget_calls();
+
+// What the host answers, to whomever, in the place of what it knows itself.
+struct PlantedAnswers {
+    // Of get_max_tunnel_number: one for each call, and the last one for all later calls.
+    std::vector<uint32> tunnel_bounds;
+    // Of sys_time_since_boot_ms.
+    std::optional<uint64> ms_since_boot;
+    // ctime_init does nothing.
+    bool without_time_info = false;
+};
+PlantedAnswers &planted();
 
 // Calls since the last reset or arming.
 unsigned num_calls(Operation operation);

@@ -179,6 +179,37 @@ TEST_F(FaultLayer, FormatsBeforeItPassesOn)
                 ElementsAre("mdb_set_node_str(*, *, 4, 0, 5, \"7\", \"%s\", \"/a/5\")"));
 }
 
+uint32 ask_for_bound()
+{
+    return get_max_tunnel_number();
+}
+
+TEST_F(FaultLayer, PlantsAnswers)
+{
+    planted().tunnel_bounds = {5, 7};
+    EXPECT_EQ(in_library(ask_for_bound), 5U);
+    EXPECT_EQ(in_library(ask_for_bound), 7U);
+    EXPECT_EQ(get_max_tunnel_number(), 7U);
+    EXPECT_EQ(num_calls(Operation::get_max_tunnel_number), 2U);
+    planted().ms_since_boot = 11;
+    EXPECT_EQ(sys_time_since_boot_ms(), 11U);
+    planted().without_time_info = true;
+    ctime_init();
+    EXPECT_EQ(time_info_ptr, nullptr);
+    reset_fault_layer();
+    ctime_init();
+    EXPECT_NE(time_info_ptr, nullptr);
+}
+
+TEST_F(FaultLayer, ForgetsCallsButNoObjects)
+{
+    tstring *string = in_library(new_string, "text");
+    forget_calls();
+    EXPECT_THAT(calls_of(Operation::ts_new_str), IsEmpty());
+    EXPECT_THAT(live_objects(), ElementsAre("tstring"));
+    ts_free(&string);
+}
+
 int log_two_lines(const char *text)
 {
     (void)lc_log_internal("f", "unit", 12, 2048, 0, 3, "said %s", text);

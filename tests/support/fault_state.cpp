@@ -109,7 +109,21 @@ void reset_fault_layer()
     struck = false;
     fault.reset();
     records() = {};
+    planted() = {};
     forget_allocations();
+}
+
+void forget_calls()
+{
+    counts = {};
+    records().calls.clear();
+    records().log.clear();
+}
+
+PlantedAnswers &planted()
+{
+    static PlantedAnswers answers;
+    return answers;
 }
 
 unsigned num_calls(Operation operation)

@@ -66,6 +66,7 @@ HostFixture::HostFixture()
     ovhost::set_config_name({});
     ovhost::set_running_db_source([this] { return &db_; });
     ov_system_info = {};
+    time_info_ptr = nullptr;
     std::fill_n(ov_log_module_levels, ov_log_module_ovmd + 1, default_module_level);
     set_log_level(max_level);
     for (const char *dir : {"/opt/orvale", "/var/opt/tms"}) {
@@ -78,6 +79,7 @@ HostFixture::~HostFixture()
     ovhost::unregister_session(peer_name, jsond_);
     ovhost::set_running_db_source({});
     ovhost::set_log_sink({});
+    time_info_ptr = nullptr;
 }
 
 void HostFixture::set(const std::string &node, bn_type type, const std::string &value)
@@ -101,6 +103,12 @@ void HostFixture::set_log_level(int level)
 {
     G_daemon_log_level = -1;
     G_log_level = level;
+}
+
+void HostFixture::set_time(uint64 ms_since_boot)
+{
+    time_.time_since_boot_ms = ms_since_boot;
+    time_info_ptr = &time_;
 }
 
 void write_file(const std::string &path, const std::string &text)

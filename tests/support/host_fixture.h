@@ -4,6 +4,7 @@
 // What the library did with it is asked of fault_layer.h.
 #pragma once
 
+#include "framework/sys_time.h"
 #include "host/framework/objects.h"
 
 #include <optional>
@@ -55,10 +56,15 @@ class HostFixture
     // The threshold in force; by default everything is logged.
     void set_log_level(int level);
 
+    // The time record says so many milliseconds since boot; without this there is none until
+    // ctime_init is called.
+    void set_time(uint64 ms_since_boot);
+
   private:
     mdb_db db_;
     TestCommit commit_;
     TestSession jsond_;
+    time_info time_ = {};
 };
 
 void write_file(const std::string &path, const std::string &text);
