@@ -1,5 +1,7 @@
 #include "tests/library/literal_table.h"
 
+#include <iterator>
+
 namespace ovtest
 {
 
@@ -7,6 +9,15 @@ namespace
 {
 
 constexpr std::size_t block_size = 24;
+constexpr uint64 golden_ratio = 0x9e3779b97f4a7c13;
+
+// To the right, or when negative to the left.
+constexpr int shifts[] = {43, -9, 8, 38, -23, 5, 35, -49, 11, 12, -18, 22};
+
+uint64 shifted(uint64 word, int shift)
+{
+    return shift > 0 ? word >> shift : word << -shift;
+}
 
 // Adds up to 24 bytes to the three words, the first of each eight at the low end.
 void add_bytes(std::array<uint64, 3> &words, const std::string &bytes)
@@ -21,26 +32,49 @@ void add_bytes(std::array<uint64, 3> &words, const std::string &bytes)
     }
 }
 
+void unmix(std::array<uint64, 3> &words)
+{
+    for (std::size_t turn = std::size(shifts); turn-- > 0;) {
+        uint64 &word = words[turn % 3];
+        const uint64 next = words[(turn + 1) % 3];
+        const uint64 last = words[(turn + 2) % 3];
+        word ^= shifted(last, shifts[turn]);
+        word += last;
+        word += next;
+    }
+}
+
+// The block that turns the first words of a hashing into these.
+std::string block_that_leads_to(std::array<uint64, 3> words, uint64 seed)
+{
+    unmix(words);
+    words[0] -= seed;
+    words[1] -= seed;
+    words[2] -= golden_ratio;
+    std::string block;
+    for (std::size_t i = 0; i < block_size; ++i) {
+        block += static_cast<char>(words[i / 8] >> (8 * (i % 8)) & 0xff);
+    }
+    return block;
+}
+
 } // namespace
 
 void literal_mix(std::array<uint64, 3> &words)
 {
-    constexpr int shifts[] = {43, -9, 8, 38, -23, 5, 35, -49, 11, 12, -18, 22};
-    std::size_t turn = 0;
-    for (const int shift : shifts) {
+    for (std::size_t turn = 0; turn < std::size(shifts); ++turn) {
         uint64 &word = words[turn % 3];
         const uint64 next = words[(turn + 1) % 3];
         const uint64 last = words[(turn + 2) % 3];
         word -= next;
         word -= last;
-        word ^= shift > 0 ? last >> shift : last << -shift;
-        ++turn;
+        word ^= shifted(last, shifts[turn]);
     }
 }
 
 LiteralKey literal_key(const std::string &text, uint64 seed, LiteralState *state)
 {
-    std::array<uint64, 3> words = {seed, seed, 0x9e3779b97f4a7c13};
+    std::array<uint64, 3> words = {seed, seed, golden_ratio};
     std::size_t at = 0;
     for (; text.size() - at >= block_size; at += block_size) {
         add_bytes(words, text.substr(at, block_size));
@@ -61,6 +95,20 @@ LiteralKey literal_key(const std::string &text, uint64 seed, LiteralState *state
         key.low ^= static_cast<unsigned char>(c);
     }
     return key;
+}
+
+std::string text_with_key(const LiteralKey &key, uint64 seed, unsigned which)
+{
+    // The first word does not show in the key, and the bytes of the text change the low half: both
+    // are tried until they fit.
+    for (uint64 first = 0;; ++first) {
+        const uint64 second = key.low ^ (first & 0xff);
+        const std::string text = block_that_leads_to({first, second, key.high}, seed);
+        if (text.find('\0') == std::string::npos && literal_key(text, seed) == key &&
+            which-- == 0) {
+            return text;
+        }
+    }
 }
 
 void LiteralTable::lower(uint32 from, uint32 to)

@@ -32,6 +32,10 @@ struct LiteralState {
 
 LiteralKey literal_key(const std::string &text, uint64 seed, LiteralState *state = nullptr);
 
+// A text of 24 bytes with this key: the mixing is turned back. There are very many; `which` chooses
+// one.
+std::string text_with_key(const LiteralKey &key, uint64 seed, unsigned which);
+
 class LiteralTable
 {
   public:

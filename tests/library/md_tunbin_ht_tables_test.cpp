@@ -335,6 +335,41 @@ TEST_P(TextTable, LongTextsAreKeptApart)
     EXPECT_EQ(find(first.substr(1)), "14004 77");
 }
 
+// Texts are told apart by their keys alone.
+TEST_P(TextTable, TextsOfOneKeyAreOneText)
+{
+    const LiteralKey key = {0x123456789abcdef0, 0x7f00};
+    const std::string first = text_with_key(key, seed(), 0);
+    const std::string second = text_with_key(key, seed(), 1);
+    ASSERT_NE(first, second);
+    add(first, 5);
+    EXPECT_EQ(find(second), "0 5");
+    add(second, 5);
+    add(second, 6);
+    EXPECT_THAT(log_lines(), ElementsAre(added(first, 5), conflict(second, 6)));
+    del(second);
+    add(first, 6);
+    EXPECT_EQ(find(second), "0 6");
+}
+
+TEST_P(TextTable, KeysOfOneHomeDifferInEitherHalf)
+{
+    const LiteralKey keys[] = {{1, 0x7f00}, {1, 0x17f00}, {1, 0x27f00}, {2, 0x17f00}, {2, 0x7f00}};
+    std::vector<std::string> texts;
+    for (const LiteralKey &key : keys) {
+        texts.push_back(text_with_key(key, seed(), 0));
+        add(texts.back(), static_cast<uint32>(texts.size()));
+    }
+    EXPECT_THAT(contents(), ElementsAre(Pair(0, "1 x5"), Pair(1, "2 x4"), Pair(2, "3 x3"),
+                                        Pair(3, "4 x2"), Pair(4, "5 x1")));
+    del(texts[1]);
+    EXPECT_EQ(find(texts[0]), "0 1");
+    EXPECT_EQ(find(texts[1]), "14004 77");
+    EXPECT_EQ(find(texts[2]), "0 3");
+    EXPECT_EQ(find(texts[3]), "0 4");
+    EXPECT_EQ(find(texts[4]), "0 5");
+}
+
 TEST_P(TextTable, IsDumpedInTheOrderOfItsSlots)
 {
     add("b", 1);

@@ -97,7 +97,7 @@ TEST(Hash, HasTheseKeys)
 TEST(Hash, TheLiteralOneHasTheseKeysToo)
 {
     for (const Vector &vector : vectors) {
-        EXPECT_EQ(literal_key(vector.text, vector.seed), LiteralKey(vector.high, vector.low))
+        EXPECT_EQ(literal_key(vector.text, vector.seed), (LiteralKey{vector.high, vector.low}))
             << vector.text << " with seed " << vector.seed;
     }
 }

@@ -79,8 +79,16 @@ class Twins
 {
   public:
     Twins(const TableOperations &table, uint32 seed_ending)
-        : Twins(table, time_with_seed_ending(seed_ending, 0xffff), 0)
+        : time_(time_with_seed_ending(seed_ending, 0xffff)), table_(table)
     {
+        begin_anew();
+    }
+
+    // Both empty, with the seed that they had.
+    void begin_anew()
+    {
+        (void)table_.init();
+        literal_ = LiteralTextTable(seed_at(time_));
     }
 
     void add(std::string text, uint32 id)
@@ -140,15 +148,10 @@ class Twins
     }
 
   private:
-    Twins(const TableOperations &table, uint64 time, int)
-        : planted_time_(time), table_(table), literal_(seed_at(time))
-    {
-        (void)table.init();
-    }
-
-    PlantedTimeOfDay planted_time_;
+    uint64 time_;
+    PlantedTimeOfDay planted_time_{time_};
     const TableOperations &table_;
-    LiteralTextTable literal_;
+    LiteralTextTable literal_{0};
 };
 
 // Mostly a text's own ID; now and then another tunnel's, the mark of a collision, or none.
@@ -189,6 +192,9 @@ TEST_P(TextTableModel, EverySlotIsAsTheLiteralTableHasIt)
     for (unsigned step = 0; step < sequence().steps; ++step) {
         // The table grows, stays, shrinks and stays, twice.
         const unsigned adds = adds_of_8_in_turn[step * 8 / sequence().steps % 4];
+        if (step == sequence().steps / 2) {
+            twins.begin_anew();
+        }
         const std::size_t i = random_.below(texts.size());
         if (random_.below(8) < adds) {
             twins.add(texts[i], random_id(i, random_));
