@@ -15,10 +15,11 @@ OV_C_BEGIN
 OV_NODISCARD int lf_test_exists(const char *path, tbool *ret);
 
 /*
- * All lines of a file, line ends removed; a last line need not have one. An empty file gives an
- * empty array. Caller frees with tstr_array_free.
- * Returns 0; 14001 on a null argument; 14013 when there is no such file; 14014 when it cannot be
- * read; 14000 when out of memory.
+ * All lines of a regular file (symbolic links followed), line ends removed; a last line need not
+ * have one. An empty file gives an empty array. Never waits for a writer. Caller frees with
+ * tstr_array_free.
+ * Returns 0; 14001 on a null argument; 14013 when there is no such file; 14014 when it is not a
+ * regular file or cannot be read; 14000 when out of memory.
  */
 OV_NODISCARD int lf_read_file_lines(const char *path, tstr_array **ret);
 

@@ -2,6 +2,7 @@
 
 #include "framework/logging.h"
 #include "host/framework/c_boundary.h"
+#include "host/framework/conf_file.h"
 #include "host/framework/log_config.h"
 #include "host/framework/objects.h"
 
@@ -26,7 +27,8 @@ using ovhost::at_c_boundary;
 class OpenFile
 {
   public:
-    OpenFile(const char *path, int flags) : fd_(::open(path, flags | O_RDONLY | O_CLOEXEC)) {}
+    /// Without O_NONBLOCK a pipe in the file's place would hold the daemon until somebody writes.
+    explicit OpenFile(const char *path) : fd_(::open(path, O_RDONLY | O_CLOEXEC | O_NONBLOCK)) {}
     OpenFile(const OpenFile &) = delete;
     OpenFile &operator=(const OpenFile &) = delete;
     ~OpenFile()
@@ -85,12 +87,12 @@ void add_lines(tstr_array &lines, char *text, std::size_t size)
     }
 }
 
-/// All lines of an open file; nothing when it cannot be read. The size of one that is no regular
-/// file is not known before its end, and any file may grow meanwhile: then it takes further passes.
+/// All lines of an open file; nothing when it is no regular one or cannot be read. It may grow
+/// meanwhile, and those of /proc do not tell their size: then it takes further passes.
 std::optional<tstr_array> read_lines(int fd)
 {
     struct stat status = {};
-    if (::fstat(fd, &status) != 0) {
+    if (::fstat(fd, &status) != 0 || !S_ISREG(status.st_mode)) {
         return std::nullopt;
     }
     tstr_array lines;
@@ -115,11 +117,14 @@ std::optional<tstr_array> read_lines(int fd)
     }
 }
 
-/// Why a configuration file may not be used; nothing when it may.
-std::optional<std::string> refusal(const char *path)
+} // namespace
+
+namespace ovhost
 {
-    // Without O_NONBLOCK a pipe in the file's place would hold the daemon until somebody writes.
-    const OpenFile file(path, O_NONBLOCK);
+
+std::optional<std::string> conf_file_refusal(const char *path)
+{
+    const OpenFile file(path);
     if (!file.is_open()) {
         return std::string("it cannot be opened: ") + std::strerror(errno);
     }
@@ -136,7 +141,7 @@ std::optional<std::string> refusal(const char *path)
     return std::nullopt;
 }
 
-} // namespace
+} // namespace ovhost
 
 int lf_test_exists(const char *path, tbool *ret)
 {
@@ -161,7 +166,7 @@ int lf_read_file_lines(const char *path, tstr_array **ret)
     if (path == nullptr) {
         return lc_err_unexpected_null;
     }
-    const OpenFile file(path, 0);
+    const OpenFile file(path);
     if (!file.is_open()) {
         return says_absent(errno) ? lc_err_file_not_found : lc_err_io_error;
     }
@@ -178,7 +183,7 @@ tbool conf_file_okay(const char *path)
     }
     return at_c_boundary(
         [path] {
-            const std::optional<std::string> reason = refusal(path);
+            const std::optional<std::string> reason = ovhost::conf_file_refusal(path);
             if (reason) {
                 ovhost::log_host_line(ov_log_notice, "files",
                                       std::string("configuration file ") + path +

@@ -49,7 +49,7 @@ constexpr const char *kPermissionAdvice =
 
 [[noreturn]] void throw_system(const std::string &doing, int cause, const char *advice)
 {
-    throw StoreError("cannot " + doing + ": " + system_message(cause) + advice);
+    throw StoreError("cannot " + doing + ": " + system_message(cause) + advice_for(cause, advice));
 }
 
 [[noreturn]] void throw_for(const SqliteError &error, const fs::path &file)
@@ -61,6 +61,14 @@ constexpr const char *kPermissionAdvice =
     case SQLITE_BUSY:
         throw StoreError("the configuration database " + file.string() +
                          " is in use by another program; end that program and try again");
+    case SQLITE_FULL:
+        throw StoreError("cannot write the configuration database " + file.string() + ": " +
+                         error.what() + space_advice);
+    case SQLITE_IOERR:
+        throw StoreError("cannot use the configuration database " + file.string() + ": " +
+                         error.what() +
+                         "; check the free space and the state of its file system, and start"
+                         " again");
     default:
         throw StoreError("cannot open the configuration database " + file.string() + ": " +
                          error.what() + kPermissionAdvice);

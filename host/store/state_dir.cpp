@@ -22,10 +22,10 @@ void make_directory(const std::filesystem::path &dir)
         return;
     const int cause = errno;
     const std::string what =
-        "cannot make the state directory " + dir.string() + ": " + system_message(cause) + "; ";
+        "cannot make the state directory " + dir.string() + ": " + system_message(cause);
     if (cause == ENOENT)
-        throw StoreError(what + "make its parent directory first");
-    throw StoreError(what + "make it, or choose another state directory");
+        throw StoreError(what + "; make its parent directory first");
+    throw StoreError(what + advice_for(cause, "; make it, or choose another state directory"));
 }
 
 void check_directory(const std::filesystem::path &dir)
@@ -49,11 +49,14 @@ UniqueFd open_lock(const std::filesystem::path &file)
         ::open(file.c_str(), O_RDWR | O_CREAT | O_CLOEXEC | O_NOFOLLOW | O_NONBLOCK, 0600));
     if (lock)
         return lock;
-    throw StoreError("cannot open the lock file " + file.string() + ": " + system_message(errno) +
-                     "; move it away, or give this user read and write permission");
+    const int cause = errno;
+    throw StoreError(
+        "cannot open the lock file " + file.string() + ": " + system_message(cause) +
+        advice_for(cause, "; move it away, or give this user read and write permission"));
 }
 
-// "" when the holder has not written its number.
+// "" when there is anything else than a number and a line end: the file may have been written to
+// by others, and its text is going to be taken for a process to end.
 std::string read_holder(int lock)
 {
     std::array<char, 24> digits{};
@@ -61,7 +64,8 @@ std::string read_holder(int lock)
     if (size <= 0)
         return {};
     const std::string text(digits.data(), static_cast<std::size_t>(size));
-    return text.substr(0, text.find_first_not_of("0123456789"));
+    const std::size_t end = text.find_first_not_of("0123456789");
+    return end != std::string::npos && text.substr(end) == "\n" ? text.substr(0, end) : "";
 }
 
 // Only for the message of the next one who tries: the lock holds without it, on a full disk too.

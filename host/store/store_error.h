@@ -1,6 +1,7 @@
 // The one error of the store: its text names the file, says what is wrong and what to do.
 #pragma once
 
+#include <cerrno>
 #include <stdexcept>
 #include <string>
 #include <system_error>
@@ -18,6 +19,14 @@ class StoreError : public std::runtime_error
 [[nodiscard]] inline std::string system_message(int error)
 {
     return std::generic_category().message(error);
+}
+
+inline constexpr const char *space_advice = "; free space on its file system and start again";
+
+// What to do about a failed system call: room is needed when there is none, whatever else helps.
+[[nodiscard]] inline const char *advice_for(int error, const char *otherwise)
+{
+    return error == ENOSPC || error == EDQUOT ? space_advice : otherwise;
 }
 
 } // namespace ovhost

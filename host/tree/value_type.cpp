@@ -1,6 +1,6 @@
 #include "host/tree/value_type.h"
 
-#include "host/tree/utf8.h"
+#include "host/support/utf8.h"
 #include "host/tree/value_format.h"
 
 #include <algorithm>

@@ -4,6 +4,7 @@
 #include "tests/framework/log_capture.h"
 #include "tests/framework/owned.h"
 
+#include <fcntl.h>
 #include <sys/stat.h>
 #include <unistd.h>
 
@@ -13,7 +14,6 @@
 #include <filesystem>
 #include <fstream>
 #include <string>
-#include <thread>
 
 namespace ovhost::test
 {
@@ -124,15 +124,40 @@ TEST_F(Files, LinesAcrossBlockBordersComeOutWhole)
     EXPECT_EQ(lines_of(content), expected);
 }
 
-TEST_F(Files, LinesCanComeFromAPipe)
+TEST_F(Files, LinesCanComeThroughALinkAndFromAFileThatDoesNotTellItsSize)
+{
+    write("file", "a\nb\n");
+    std::filesystem::create_symlink("file", path("link"));
+    OwnedStrings linked;
+    ASSERT_EQ(lf_read_file_lines(path("link").c_str(), linked.out()), 0);
+    EXPECT_THAT(texts_of(linked), ElementsAre("a", "b"));
+    OwnedStrings untold;
+    ASSERT_EQ(lf_read_file_lines("/proc/self/status", untold.out()), 0);
+    EXPECT_THAT(texts_of(untold), testing::Contains(testing::StartsWith("Pid:")));
+}
+
+TEST_F(Files, LinesComeFromNothingButARegularFile)
 {
     ASSERT_EQ(::mkfifo(path("pipe").c_str(), 0600), 0);
-    std::thread writer([this] { std::ofstream(path("pipe")) << "a\nb" << std::flush << "c\n"; });
+    std::filesystem::create_symlink("pipe", path("link"));
+    std::filesystem::create_directory(path("dir"));
+    // The pipe has no writer: waiting for one would last for ever.
+    for (const std::string &name :
+         {path("pipe"), path("link"), path("dir"), std::string("/dev/null")}) {
+        OwnedStrings lines;
+        EXPECT_EQ(lf_read_file_lines(name.c_str(), lines.out()), 14014) << name;
+        EXPECT_EQ(lines.get(), nullptr) << name;
+    }
+}
+
+TEST_F(Files, LinesDoNotComeFromAPipeThatHasSome)
+{
+    ASSERT_EQ(::mkfifo(path("pipe").c_str(), 0600), 0);
+    const int writer = ::open(path("pipe").c_str(), O_RDWR | O_CLOEXEC);
+    ASSERT_EQ(::write(writer, "a\nb\n", 4), 4);
     OwnedStrings lines;
-    const int status = lf_read_file_lines(path("pipe").c_str(), lines.out());
-    writer.join();
-    ASSERT_EQ(status, 0);
-    EXPECT_THAT(texts_of(lines), ElementsAre("a", "bc"));
+    EXPECT_EQ(lf_read_file_lines(path("pipe").c_str(), lines.out()), 14014);
+    ::close(writer);
 }
 
 TEST_F(Files, ReadSaysWhatFailed)

@@ -69,11 +69,17 @@ TEST(StateDir, ARefusalWithoutAKnownHolderSaysSo)
 {
     const ScratchDir scratch;
     const StateDir dir(scratch.path());
-    ovtest::write_file(scratch / "lock", "");
-    EXPECT_EQ(lock_refusal(scratch.path()),
-              "the state directory " + scratch.path().string() +
-                  " is held by another daemon; end that daemon, or choose another state"
-                  " directory");
+    // Nothing, no line end, an empty line, other text, and more text than a number is long.
+    for (const std::string &text :
+         {std::string(), std::string("12"), std::string("\n"), std::string("12 monkeys\n"),
+          std::string("12\n13\n"), std::string("-1\n"), std::string(30, '1') + "\n"}) {
+        ovtest::write_file(scratch / "lock", text);
+        EXPECT_EQ(lock_refusal(scratch.path()),
+                  "the state directory " + scratch.path().string() +
+                      " is held by another daemon; end that daemon, or choose another state"
+                      " directory")
+            << text;
+    }
 }
 
 TEST(StateDir, IsFreeAgainAfterItsHolder)

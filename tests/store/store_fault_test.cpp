@@ -2,6 +2,7 @@
 // what is left: in the store at hand, and in a copy of its files, which is what a crash at that
 // moment would leave.
 
+#include <gmock/gmock.h>
 #include <gtest/gtest.h>
 #include <signal.h>
 #include <sqlite3.h>
@@ -267,6 +268,29 @@ TEST_P(StoreFault, ANewStoreIsMadeWholeOrNotAtAll)
         EXPECT_TRUE(Store::open(scratch.path()).empty());
     }
     EXPECT_GT(refusals, 2);
+}
+
+TEST_P(StoreFault, ANewStoreThatFindsNoRoomDoesNotAskForPermissions)
+{
+    using testing::EndsWith;
+    for (int n = 1;; ++n) {
+        SCOPED_TRACE(n);
+        const ScratchDir scratch;
+        std::string message;
+        {
+            const FaultsFrom active(n, GetParam());
+            message = ovtest::refusal(scratch.path());
+        }
+        if (faults.hits == 0)
+            break;
+        EXPECT_THAT(message, testing::Not(testing::HasSubstr("permission")));
+        if (n == 1) {
+            EXPECT_THAT(message, testing::StartsWith("cannot write the configuration database " +
+                                                     scratch.path().string()));
+            EXPECT_THAT(message, EndsWith("(No space left on device); free space on its file system"
+                                          " and start again"));
+        }
+    }
 }
 
 TEST_P(StoreFault, TheEndOfAStoreLosesNothing)

@@ -1,4 +1,4 @@
-#include "host/tree/utf8.h"
+#include "host/support/utf8.h"
 
 #include <gtest/gtest.h>
 

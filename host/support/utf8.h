@@ -1,6 +1,5 @@
 #pragma once
-// Well-formed UTF-8, for value_format.h, which checks values, and value_type.h, which quotes them
-// in messages.
+// Well-formed UTF-8, for whoever checks or quotes a text.
 
 #include <cstddef>
 #include <string_view>

@@ -1,0 +1,9 @@
+#pragma once
+// The version that every program of the host answers to --version.
+
+namespace ovhost
+{
+
+[[nodiscard]] const char *program_version();
+
+} // namespace ovhost
