@@ -48,7 +48,7 @@ Connection::Connection(EventLoop &loop, UniqueFd fd, std::uint64_t number,
       owner_(owner),
       read_event_(new_event(loop, fd_.get(), EV_READ | EV_PERSIST, on_readable, this)),
       write_event_(new_event(loop, fd_.get(), EV_WRITE, on_writable, this)),
-      input_(limits.max_request)
+      request_timer_(new_event(loop, -1, 0, on_overdue, this)), input_(limits.max_request)
 {
     resume_reading();
 }
@@ -64,6 +64,11 @@ void Connection::on_writable(int, short what, void *connection)
         ->guarded((what & EV_WRITE) != 0 ? &Connection::write_output : &Connection::check_stall);
 }
 
+void Connection::on_overdue(int, short, void *connection)
+{
+    static_cast<Connection *>(connection)->guarded(&Connection::check_request);
+}
+
 /// The event loop is C code: an exception ends the connection it came from, not the daemon.
 void Connection::guarded(void (Connection::*step)())
 {
@@ -76,18 +81,25 @@ void Connection::guarded(void (Connection::*step)())
 
 void Connection::read_input()
 {
+    if (receive_piece())
+        serve();
+}
+
+/// False when there was nothing to receive, or the connection is over.
+bool Connection::receive_piece()
+{
     std::array<char, 65536> piece;
     const ssize_t got = ::recv(fd_.get(), piece.data(), piece.size(), MSG_DONTWAIT);
     if (got < 0) {
         if (errno != EAGAIN && errno != EINTR)
             end(errno == ECONNRESET ? std::string() : std::strerror(errno));
-        return;
+        return false;
     }
     if (got == 0)
         end_of_input_ = true;
     else
         input_.feed({piece.data(), static_cast<std::size_t>(got)});
-    serve();
+    return true;
 }
 
 void Connection::write_output()
@@ -106,6 +118,17 @@ void Connection::check_stall()
             std::to_string(limits_.stall_timeout.count()) + " ms");
 }
 
+/// The rest may have arrived while the daemon was busy: that is not held against the client.
+void Connection::check_request()
+{
+    overdue_ = true;
+    while (overdue_ && receive_piece())
+        serve();
+    if (overdue_)
+        end("has not ended its request: " + std::to_string(input_.rest().size()) +
+            " bytes of it came within " + std::to_string(limits_.stall_timeout.count()) + " ms");
+}
+
 /// Answers what has come in, as long as the client reads its answers.
 void Connection::serve()
 {
@@ -113,15 +136,7 @@ void Connection::serve()
     if (serving_ || finishing_)
         return;
     serving_ = true;
-    while (!over_ && !finishing_ && waiting() < limits_.max_waiting) {
-        const auto line = input_.next();
-        if (!line) {
-            serve_end_of_input();
-            break;
-        }
-        if (line->find_first_not_of(" \t\r") != std::string_view::npos)
-            send(owner_.answer(*this, *line));
-    }
+    const bool any = serve_lines();
     serving_ = false;
     if (over_ || finishing_)
         return;
@@ -129,6 +144,24 @@ void Connection::serve()
         pause_reading();
     else
         resume_reading();
+    watch_request(any);
+}
+
+/// Whether there was a line.
+bool Connection::serve_lines()
+{
+    bool any = false;
+    while (!over_ && !finishing_ && waiting() < limits_.max_waiting) {
+        const auto line = input_.next();
+        if (!line) {
+            serve_end_of_input();
+            break;
+        }
+        any = true;
+        if (line->find_first_not_of(" \t\r") != std::string_view::npos)
+            send(owner_.answer(*this, *line));
+    }
+    return any;
 }
 
 /// Every whole line is answered: what is left to do when no more can come.
@@ -210,6 +243,7 @@ void Connection::await_writable()
 void Connection::pause_reading()
 {
     event_del(read_event_.get());
+    stop_request_timer();
 }
 
 void Connection::resume_reading()
@@ -218,12 +252,31 @@ void Connection::resume_reading()
         event_add(read_event_.get(), nullptr);
 }
 
+/// A request has its time from when it began, however often a piece of it comes.
+void Connection::watch_request(bool begins_anew)
+{
+    const bool begun = !input_.rest().empty();
+    if (begins_anew || !begun)
+        stop_request_timer();
+    if (!begun || overdue_ || event_pending(request_timer_.get(), EV_TIMEOUT, nullptr) != 0)
+        return;
+    event_base_update_cache_time(event_get_base(request_timer_.get()));
+    const timeval patience = to_timeval(limits_.stall_timeout);
+    event_add(request_timer_.get(), &patience);
+}
+
+void Connection::stop_request_timer()
+{
+    event_del(request_timer_.get());
+    overdue_ = false;
+}
+
 void Connection::end(const std::string &fault)
 {
     if (over_)
         return;
     over_ = true;
-    event_del(read_event_.get());
+    pause_reading();
     event_del(write_event_.get());
     ::shutdown(fd_.get(), SHUT_RDWR);
     owner_.ended(*this, fault);

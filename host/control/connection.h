@@ -27,7 +27,8 @@ struct ServerLimits {
     /// not lose the events of a large commit.
     std::size_t max_events_waiting = 64UL << 20;
     std::size_t max_clients = 512;
-    /// A client that has not taken one waiting byte for so long is disconnected.
+    /// A client that has not taken one waiting byte for so long is disconnected, and one that has
+    /// begun a request and has not ended it for so long: what is there of it is kept meanwhile.
     std::chrono::milliseconds stall_timeout{30000};
 };
 
@@ -66,18 +67,24 @@ class Connection
   private:
     static void on_readable(int fd, short what, void *connection);
     static void on_writable(int fd, short what, void *connection);
+    static void on_overdue(int fd, short what, void *connection);
 
     void guarded(void (Connection::*step)());
     void read_input();
+    [[nodiscard]] bool receive_piece();
     void write_output();
     void check_stall();
+    void check_request();
     void serve();
+    [[nodiscard]] bool serve_lines();
     void serve_end_of_input();
     void send(std::string_view line);
     void flush();
     void await_writable();
     void pause_reading();
     void resume_reading();
+    void watch_request(bool begins_anew);
+    void stop_request_timer();
     void end(const std::string &fault);
 
     UniqueFd fd_;
@@ -86,6 +93,7 @@ class Connection
     Owner &owner_;
     EventPtr read_event_;
     EventPtr write_event_;
+    EventPtr request_timer_;
     LineSplitter input_;
     OutputQueue output_;
     bool end_of_input_ = false;
@@ -93,6 +101,7 @@ class Connection
     bool serving_ = false;
     bool over_ = false;
     bool progress_ = false;
+    bool overdue_ = false;
 };
 
 } // namespace ovhost

@@ -75,7 +75,8 @@ json parse_request(std::string_view line, json &id)
         throw RequestError(error_code::bad_request,
                            std::string("a request is a JSON object, this is of type ") +
                                request.type_name());
-    if (const auto given = request.find("id"); given != request.end()) {
+    // A null id is one that was left out: the answer carries null for both.
+    if (const auto given = request.find("id"); given != request.end() && !given->is_null()) {
         if (!given->is_number_integer())
             throw RequestError(error_code::bad_request,
                                std::string("\"id\" is a whole number, this is of type ") +

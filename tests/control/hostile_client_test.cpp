@@ -215,6 +215,61 @@ TEST(HostileClientTest, AClientThatLeavesWithoutReadingDoesNoHarm)
     EXPECT_TRUE(eventually([&] { return server.client_count() == 0; }));
 }
 
+TEST(HostileClientTest, ARequestThatIsNotEndedEndsTheConnectionHoweverOftenAPieceComes)
+{
+    TestServer server({}, {.stall_timeout = std::chrono::milliseconds(300)});
+    RawClient slow(server.path());
+    expect_served(slow);
+    ASSERT_TRUE(slow.send("{\"id\":1,"));
+    const auto began = std::chrono::steady_clock::now();
+    EXPECT_TRUE(eventually([&] { return !slow.send(" "); }));
+    EXPECT_GE(std::chrono::steady_clock::now() - began, std::chrono::milliseconds(250));
+    const auto lines = server.logged("has not ended its request");
+    ASSERT_EQ(lines.size(), 1U);
+    EXPECT_NE(lines[0].find("client 1 (pid "), std::string::npos) << lines[0];
+    EXPECT_NE(lines[0].find(" came within 300 ms"), std::string::npos) << lines[0];
+    RawClient other(server.path());
+    expect_served(other);
+}
+
+TEST(HostileClientTest, AClientThatBeginsNoRequestIsNotDisconnected)
+{
+    TestServer server({}, {.stall_timeout = std::chrono::milliseconds(100)});
+    RawClient quiet(server.path());
+    expect_served(quiet);
+    // Each request is begun and ended in time, and all of them take longer than one may.
+    const std::string request(echo_request);
+    for (int i = 0; i < 10; ++i) {
+        ASSERT_TRUE(quiet.send(request.substr(0, 10)));
+        std::this_thread::sleep_for(std::chrono::milliseconds(20));
+        ASSERT_TRUE(quiet.send(request.substr(10)));
+        EXPECT_EQ(quiet.line(), echo_answer);
+    }
+    std::this_thread::sleep_for(std::chrono::milliseconds(300));
+    expect_served(quiet);
+    EXPECT_TRUE(server.logged("disconnected").empty());
+}
+
+TEST(HostileClientTest, ARequestThatIsEndedWhileTheServerIsBusyIsServed)
+{
+    const std::string text(1UL << 20, 'x');
+    TestServer server(
+        [&](const json &request, const ClientInfo &) -> json {
+            if (request.at("command") == "wait")
+                std::this_thread::sleep_for(std::chrono::milliseconds(600));
+            return {{"length", request.value("text", "").size()}};
+        },
+        {.stall_timeout = std::chrono::milliseconds(300)});
+    RawClient busy(server.path());
+    RawClient client(server.path());
+    ASSERT_TRUE(client.send("{\"id\":1,\"command\":\"get\","));
+    ASSERT_TRUE(eventually([&] { return server.client_count() == 2; }));
+    std::this_thread::sleep_for(std::chrono::milliseconds(50));
+    ASSERT_TRUE(busy.send("{\"command\":\"wait\"}\n"));
+    ASSERT_TRUE(client.send("\"text\":\"" + text + "\"}\n"));
+    EXPECT_EQ(client.line(), R"({"id":1,"ok":true,"result":{"length":1048576}})");
+}
+
 TEST(HostileClientTest, TooManyClientsAreTurnedAwayWithAReason)
 {
     TestServer server({}, {.max_clients = 2});

@@ -46,6 +46,8 @@ TEST(MessageTest, ARequestMayGoWithoutAnId)
     json id;
     static_cast<void>(parse_request(R"({"command":"check"})", id));
     EXPECT_TRUE(id.is_null());
+    EXPECT_EQ(parse_request(R"({"id":null,"command":"check"})", id).at("command"), "check");
+    EXPECT_TRUE(id.is_null());
 }
 
 TEST(MessageTest, MalformedJsonIsNamedWithItsPlace)
