@@ -54,13 +54,23 @@ typedef struct hash64_state {
 /* The golden ratio, an arbitrary value that starts the third word. */
 #define HASH64_GOLDEN_RATIO 0x9e3779b97f4a7c13u
 
+/*
+ * Holds the compiler to forming this sum first. The third word is known last: what does not need it
+ * must not wait for it.
+ */
+static inline uint64 hash64_first(uint64 sum)
+{
+    __asm__("" : "+r"(sum));
+    return sum;
+}
+
 static inline void hash64_mix(uint64 *pa, uint64 *pb, uint64 *pc)
 {
     uint64 a = *pa;
     uint64 b = *pb;
     uint64 c = *pc;
 
-    a -= b, a -= c, a ^= c >> 43;
+    a = hash64_first(a - b), a -= c, a ^= c >> 43;
     b -= c, b -= a, b ^= a << 9;
     c -= a, c -= b, c ^= b >> 8;
     a -= b, a -= c, a ^= c >> 38;
@@ -157,7 +167,7 @@ static inline okv_key hash64_key(const char *text, uint64 seed, hash64_state *st
         bytes ^= words[0] ^ words[1] ^ words[2];
         a += words[0];
         b += words[1];
-        c += words[2] + (uint64)(length - i);
+        c += hash64_first(words[2] + (uint64)(length - i));
         hash64_mix(&a, &b, &c);
     }
     return okv_key_of(c, low ^ hash64_fold(bytes));

@@ -1,9 +1,9 @@
 // Finds slots of an ov_kvassoc table without walking it.
 //
 // Names of under 24 bytes share at most 256 home slots, so that a walk from a key's home passes
-// thousands of others. What the table holds is fixed to the count; where a key stands, and where
-// the next empty slot is, is told here in constant time. The table belongs to one owner, who makes
-// every change through an index.
+// thousands of others. What the table holds is fixed to the count; where a key stands that is not
+// at home is told here in constant time, and where the next empty slot is, by a search over one
+// byte for each slot. The table belongs to one owner, who makes every change through an index.
 #pragma once
 
 #include "orvale/ov_kvassoc.h"
@@ -41,7 +41,7 @@ class slot_index
             return home;
         }
         const uint32 bucket = find_bucket(table, key);
-        return bucket != no_bucket ? slot_in(buckets_[bucket]) : no_slot;
+        return bucket != no_bucket ? buckets_[bucket] - 1 : no_slot;
     }
 
     // Stores a key that is not there. False when the table is full, which leaves it as it was.
@@ -75,30 +75,27 @@ class slot_index
     }
 
   private:
+    // Only keys that are not at home have a bucket: well-spread keys pay for none. A bucket holds a
+    // slot, counted from 1; 0 is an empty bucket.
     static constexpr uint32 num_buckets = OKV_ASSOC_SIZE;
     static constexpr uint32 no_bucket = num_buckets;
-    static constexpr uint32 slot_bits = 17;
 
-    // A bucket holds a slot, counted from 1, under 15 bits of its key; 0 is an empty bucket. The
-    // high half of a key is well mixed: its lowest bits choose the bucket, the next ones the tag.
+    // The high half of a key tells apart those that share a home.
     static uint32 first_bucket(okv_key key)
     {
         return static_cast<uint32>(okv_key_high(key)) & (num_buckets - 1);
     }
-    static uint32 next_bucket(uint32 bucket) { return (bucket + 1) & (num_buckets - 1); }
-    static uint32 tag_of(okv_key key)
-    {
-        return static_cast<uint32>(okv_key_high(key) >> 16) << slot_bits;
-    }
-    static uint32 slot_in(uint32 content) { return (content & ((1u << slot_bits) - 1)) - 1; }
-    static bool has_tag(uint32 content, uint32 tag) { return ((content ^ tag) >> slot_bits) == 0; }
 
+    static uint32 next_bucket(uint32 bucket) { return (bucket + 1) & (num_buckets - 1); }
+
+    static uint32 distance(uint32 from, uint32 to) { return (to - from) & (num_buckets - 1); }
+
+    // All buckets may be taken when all slots are.
     uint32 find_bucket(const okv_assoc_entry *table, okv_key key) const
     {
-        const uint32 tag = tag_of(key);
         uint32 bucket = first_bucket(key);
         for (uint32 n = 0; n < num_buckets && buckets_[bucket] != 0; ++n) {
-            if (has_tag(buckets_[bucket], tag) && table[slot_in(buckets_[bucket])].key == key) {
+            if (table[buckets_[bucket] - 1].key == key) {
                 return bucket;
             }
             bucket = next_bucket(bucket);
@@ -113,23 +110,22 @@ class slot_index
         while (buckets_[bucket] != 0) {
             bucket = next_bucket(bucket);
         }
-        buckets_[bucket] = tag_of(key) | (slot + 1);
+        buckets_[bucket] = slot + 1;
     }
 
     // Empties a bucket and moves up those behind it that would no longer be found past the gap.
     void leave(const okv_assoc_entry *table, uint32 gap)
     {
-        uint32 bucket = next_bucket(gap);
-        for (; buckets_[bucket] != 0 && bucket != gap; bucket = next_bucket(bucket)) {
-            const uint32 first = first_bucket(table[slot_in(buckets_[bucket])].key);
-            const uint32 from_first = (bucket - first) & (num_buckets - 1);
-            const uint32 from_gap = (bucket - gap) & (num_buckets - 1);
-            if (from_first >= from_gap) {
+        buckets_[gap] = 0;
+        for (uint32 bucket = next_bucket(gap); buckets_[bucket] != 0;
+             bucket = next_bucket(bucket)) {
+            const uint32 first = first_bucket(table[buckets_[bucket] - 1].key);
+            if (distance(first, bucket) >= distance(gap, bucket)) {
                 buckets_[gap] = buckets_[bucket];
+                buckets_[bucket] = 0;
                 gap = bucket;
             }
         }
-        buckets_[gap] = 0;
     }
 
     // The first empty slot from `home` on, around the end; no_slot when there is none.
@@ -142,9 +138,8 @@ class slot_index
         if (empty == nullptr) {
             empty = memchr(occupied_, false, home);
         }
-        return empty != nullptr
-                   ? static_cast<uint32>(static_cast<const bool *>(empty) - occupied_)
-                   : no_slot;
+        return empty != nullptr ? static_cast<uint32>(static_cast<const bool *>(empty) - occupied_)
+                                : no_slot;
     }
 
     // Adds to the counts from a key's home to its slot, both included.
