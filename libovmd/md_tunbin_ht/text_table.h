@@ -46,11 +46,8 @@ class text_table
         if (id == OKV_INVALID_VALUE) {
             return;
         }
-        if (index_.insert(Table::assoc(), key, id)) {
+        if (store<Table::failed_format>(key, id, text, OKV_KEY_ARGS(key), id)) {
             OV_LOG(ov_log_info, Table::added_format, Table::add_name, text, OKV_KEY_ARGS(key), id);
-        } else {
-            OV_LOG(ov_log_error, Table::failed_format, Table::add_name, text, OKV_KEY_ARGS(key),
-                   id);
         }
     }
 
@@ -109,9 +106,19 @@ class text_table
         }
         OV_LOG(ov_log_error, Table::conflict_format, Table::add_name, text, OKV_KEY_ARGS(key), id);
         index_.remove(Table::assoc(), key, slot);
-        if (!index_.insert(Table::assoc(), key, TUNBIN_HT_COLLISION)) {
-            OV_LOG(ov_log_error, Table::collision_failed_format, Table::add_name);
+        (void)store<Table::collision_failed_format>(key, TUNBIN_HT_COLLISION);
+    }
+
+    // Stores a key that is not there; when there is no room for it a line says so, made of the
+    // operation's name and the arguments.
+    template <const auto &failed_format, typename... Arguments>
+    static bool store(okv_key key, okv_value value, Arguments... arguments)
+    {
+        const bool is_stored = index_.insert(Table::assoc(), key, value);
+        if (!is_stored) {
+            OV_LOG(ov_log_error, failed_format, Table::add_name, arguments...);
         }
+        return is_stored;
     }
 
     static slot_index index_;
