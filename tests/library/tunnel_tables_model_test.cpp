@@ -88,8 +88,10 @@ class Twins
     void begin_anew()
     {
         (void)table_.init();
-        literal_ = LiteralTextTable(seed_at(time_));
+        literal_ = LiteralTextTable(seed());
     }
+
+    uint64 seed() const { return seed_at(time_); }
 
     void add(std::string text, uint32 id)
     {
@@ -246,6 +248,33 @@ TEST_P(TextTableAsAWhole, SaysOfEachAddWhatBecameOfIt)
         }
     }
     twins.compare_all_slots();
+}
+
+// However few bits of the keys are looked at on the way to a slot.
+TEST_P(TextTableAsAWhole, KeepsApartKeysThatShareMostOfTheirBits)
+{
+    constexpr unsigned keys_of_a_kind = 60;
+    Twins twins(table(), 0x4000);
+    std::vector<std::string> texts;
+    for (uint64 n = 1; n <= keys_of_a_kind; ++n) {
+        for (const unsigned bits : {0U, 16U, 32U, 48U}) {
+            texts.push_back(text_with_key({n << bits, 0x7f00}, twins.seed(), 0));
+            if (bits != 0) {
+                texts.push_back(text_with_key({0x5555, n << bits | 0x7f00}, twins.seed(), 0));
+            }
+        }
+    }
+    for (unsigned step = 0; step < 10000; ++step) {
+        const std::size_t i = random_.below(texts.size());
+        if (random_.below(4) != 0) {
+            twins.add(texts[i], static_cast<uint32>(i));
+        } else {
+            twins.del(texts[i]);
+        }
+        ASSERT_NO_FATAL_FAILURE(twins.compare_find(texts[random_.below(texts.size())]));
+    }
+    ASSERT_NO_FATAL_FAILURE(twins.compare_all_slots());
+    EXPECT_GT(twins.num_live(), texts.size() / 2);
 }
 
 TEST_P(TextTableAsAWhole, IsFilledToTheLastSlotAndEmptiedAgain)
