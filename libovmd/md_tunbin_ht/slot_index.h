@@ -67,7 +67,7 @@ class slot_index
     {
         const uint32 home = okv_home(key);
         if (slot != home) {
-            leave(table, find_bucket(table, key));
+            leave(table, key);
         }
         table[slot].value = OKV_INVALID_VALUE;
         occupied_[slot] = false;
@@ -103,8 +103,9 @@ class slot_index
         return no_bucket;
     }
 
-    // There is always room: a key in the table has one bucket at most.
-    void enter(okv_key key, uint32 slot)
+    // There is always room: a key in the table has one bucket at most. Spread keys seldom need
+    // this or leave(), which therefore stay out of their callers.
+    [[gnu::noinline]] void enter(okv_key key, uint32 slot)
     {
         uint32 bucket = first_bucket(key);
         while (buckets_[bucket] != 0) {
@@ -113,9 +114,11 @@ class slot_index
         buckets_[bucket] = slot + 1;
     }
 
-    // Empties a bucket and moves up those behind it that would no longer be found past the gap.
-    void leave(const okv_assoc_entry *table, uint32 gap)
+    // Empties a key's bucket and moves up those behind it that would no longer be found past the
+    // gap.
+    [[gnu::noinline]] void leave(const okv_assoc_entry *table, okv_key key)
     {
+        uint32 gap = find_bucket(table, key);
         buckets_[gap] = 0;
         for (uint32 bucket = next_bucket(gap); buckets_[bucket] != 0;
              bucket = next_bucket(bucket)) {
