@@ -113,11 +113,6 @@ void sizes(benchmark::internal::Benchmark *bench)
 BENCHMARK(store_alone)->Apply(sizes);
 BENCHMARK(commit)->Apply(sizes);
 
-std::string row(const char *bench, int num_changes)
-{
-    return std::string(bench) + "/" + std::to_string(num_changes) + "/repeats:5/real_time";
-}
-
 } // namespace
 
 int main(int argc, char **argv)
@@ -125,10 +120,20 @@ int main(int argc, char **argv)
     const ovbench::ScratchDir root;
     ovhost::enter_private_root(root.path());
     G_daemon_log_level = ov_log_error;
-    return ovbench::run_with_goals(argc, argv,
-                                   {{row("commit", 1), row("store_alone", 1), 0},
-                                    {row("commit", 100), row("store_alone", 100), 0},
-                                    {row("commit", 10'000), row("store_alone", 10'000), 0},
-                                    {row("commit", 100), row("commit", 1), 0},
-                                    {row("commit", 10'000), row("commit", 100), 0}});
+    const ovbench::GoalTable beside_store{"Commits on a store of 100,000 nodes: the daemon's whole "
+                                          "road, beside what the durable store "
+                                          "alone takes for the same changes. There is no goal.",
+                                          "changes",
+                                          "commit",
+                                          {"store alone"},
+                                          {{"1", "commit/1", {{"store_alone/1"}}},
+                                           {"100", "commit/100", {{"store_alone/100"}}},
+                                           {"10,000", "commit/10000", {{"store_alone/10000"}}}}};
+    const ovbench::GoalTable growth{
+        "How a commit grows with its changes.",
+        "changes",
+        "commit",
+        {"a hundredth of the changes"},
+        {{"100", "commit/100", {{"commit/1"}}}, {"10,000", "commit/10000", {{"commit/100"}}}}};
+    return ovbench::run_with_goals(argc, argv, {"Commits", {beside_store, growth}});
 }

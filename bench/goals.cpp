@@ -5,11 +5,17 @@
 #include <cstdio>
 #include <map>
 #include <optional>
+#include <string_view>
 
 namespace ovbench
 {
 namespace
 {
+
+struct Median {
+    double time;
+    const char *unit;
+};
 
 /// Shows the figures as usual and keeps the medians.
 class MedianKeeper : public benchmark::ConsoleReporter
@@ -21,59 +27,139 @@ class MedianKeeper : public benchmark::ConsoleReporter
     {
         for (const Run &run : runs) {
             if (run.run_type == Run::RT_Aggregate && run.aggregate_name == "median") {
-                medians_[run.run_name.str()] = run.GetAdjustedRealTime();
+                medians_[name_of(run)] = {run.GetAdjustedRealTime(),
+                                          benchmark::GetTimeUnitString(run.time_unit)};
             }
         }
         ConsoleReporter::ReportRuns(runs);
     }
 
-    [[nodiscard]] std::optional<double> median(const std::string &bench) const
+    [[nodiscard]] std::optional<Median> median(const std::string &bench) const
     {
         const auto found = medians_.find(bench);
         return found != medians_.end() ? std::optional(found->second) : std::nullopt;
     }
 
   private:
-    std::map<std::string, double> medians_;
+    static std::string name_of(const Run &run)
+    {
+        const std::string &args = run.run_name.args;
+        return run.run_name.function_name + (args.empty() ? "" : "/" + args);
+    }
+
+    std::map<std::string, Median> medians_;
 };
 
-/// One row of the table; false when the goal was missed. Benches that were not selected have none.
-bool print_goal(const MedianKeeper &medians, const Goal &goal)
+struct Score {
+    int goals = 0;
+    int reached = 0;
+};
+
+std::string printed(const char *format, auto... values)
 {
-    const auto bench = medians.median(goal.bench);
-    const auto peer = medians.median(goal.peer);
-    if (!bench || !peer) {
-        return true;
+    char text[64];
+    (void)std::snprintf(text, sizeof text, format, values...);
+    return text;
+}
+
+std::string printed(const Median &median)
+{
+    return printed(median.time < 100 ? "%.1f %s" : "%.0f %s", median.time, median.unit);
+}
+
+/// A peer's time and the ratio to it, beside the goal if there is one.
+std::string peer_cell(const MedianKeeper &medians, const Median &bench, const Peer &peer,
+                      Score &score)
+{
+    auto median = medians.median(peer.bench);
+    if (!median) {
+        return "";
     }
-    const double ratio = *bench / *peer;
-    const bool reached = goal.limit == 0 || ratio <= goal.limit;
-    if (goal.limit == 0) {
-        std::printf("%-52s %-52s %8.2f\n", goal.bench.c_str(), goal.peer.c_str(), ratio);
-    } else {
-        std::printf("%-52s %-52s %8.2f %8.2f  %s\n", goal.bench.c_str(), goal.peer.c_str(), ratio,
-                    goal.limit, reached ? "reached" : "MISSED");
+    median->time += peer.extra;
+    const double ratio = bench.time / median->time;
+    const std::string time = printed(*median);
+    if (peer.limit == 0) {
+        return time + printed(": %.2f x", ratio);
     }
-    return reached;
+    const bool reached = ratio <= peer.limit;
+    score.goals += 1;
+    score.reached += reached ? 1 : 0;
+    return time + printed(reached ? ": %.2f x of %.2f" : ": **%.2f x of %.2f**", ratio, peer.limit);
+}
+
+/// Benches that were not selected have no row.
+Score print_row(const MedianKeeper &medians, const GoalRow &row)
+{
+    Score score;
+    const auto bench = medians.median(row.bench);
+    if (!bench) {
+        return score;
+    }
+    std::printf("| %s | %s |", row.label.c_str(), printed(*bench).c_str());
+    for (const Peer &peer : row.peers) {
+        std::printf(" %s |", peer_cell(medians, *bench, peer, score).c_str());
+    }
+    std::printf(" %s |\n", score.goals == 0               ? ""
+                           : score.goals == score.reached ? "reached"
+                                                          : "**MISSED**");
+    return score;
+}
+
+Score print_table(const MedianKeeper &medians, const GoalTable &table)
+{
+    std::printf("\n%s\n\n| %s | %s |", table.text.c_str(), table.heading.c_str(),
+                table.bench_column.c_str());
+    for (const std::string &column : table.peer_columns) {
+        std::printf(" %s |", column.c_str());
+    }
+    std::printf(" goal |\n|---|---|");
+    for (std::size_t i = 0; i < table.peer_columns.size(); ++i) {
+        std::printf("---|");
+    }
+    std::printf("---|\n");
+    Score score;
+    for (const GoalRow &row : table.rows) {
+        const Score of_row = print_row(medians, row);
+        score.goals += of_row.goals;
+        score.reached += of_row.reached;
+    }
+    return score;
+}
+
+Score print_report(const MedianKeeper &medians, const GoalReport &report)
+{
+    std::printf("\n## %s\n", report.title.c_str());
+    Score score;
+    for (const GoalTable &table : report.tables) {
+        const Score of_table = print_table(medians, table);
+        score.goals += of_table.goals;
+        score.reached += of_table.reached;
+    }
+    if (score.goals > 0) {
+        std::printf("\nGoals reached: %d of %d.\n", score.reached, score.goals);
+    }
+    return score;
 }
 
 } // namespace
 
-int run_with_goals(int argc, char **argv, const std::vector<Goal> &goals)
+int run_with_goals(int argc, char **argv, const GoalReport &report)
 {
-    benchmark::Initialize(&argc, argv);
-    if (benchmark::ReportUnrecognizedArguments(argc, argv)) {
+    // Whatever else the machine does for a while then falls on a bench and its peers alike.
+    std::string interleaving = "--benchmark_enable_random_interleaving=true";
+    std::vector<char *> arguments = {argv[0], interleaving.data()};
+    arguments.insert(arguments.end(), argv + 1, argv + argc);
+    int num_arguments = static_cast<int>(arguments.size());
+    arguments.push_back(nullptr);
+    benchmark::Initialize(&num_arguments, arguments.data());
+    if (benchmark::ReportUnrecognizedArguments(num_arguments, arguments.data())) {
         return 2;
     }
     MedianKeeper medians;
     benchmark::RunSpecifiedBenchmarks(&medians);
-    std::printf("\n%-52s %-52s %8s %8s\n", "median of", "divided by the median of", "ratio",
-                "goal");
-    bool all_reached = true;
-    for (const Goal &goal : goals) {
-        all_reached = print_goal(medians, goal) && all_reached;
-    }
+    const Score score = print_report(medians, report);
     benchmark::Shutdown();
-    return all_reached ? 0 : 1;
+    return score.reached == score.goals ? 0 : 1;
 }
 
 } // namespace ovbench

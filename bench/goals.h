@@ -1,6 +1,7 @@
 #pragma once
-// Goals between benches of one run: a bench's time as a multiple of a named peer's. The table is
-// printed behind the figures it is made of.
+// Goals between benches of one run: a bench's time as a multiple of its peers'. The report is
+// printed behind the figures it is made of, as Markdown, so that scripts/bench can put it into
+// docs/performance.md as it is.
 
 #include <benchmark/benchmark.h>
 
@@ -10,14 +11,36 @@
 namespace ovbench
 {
 
-struct Goal {
-    std::string bench; ///< full name as the console shows it
-    std::string peer;
-    double limit; ///< largest ratio that reaches the goal; 0: the ratio is told, no goal is set
+/// What a bench is measured against. Benches are named as they were registered, with their
+/// arguments: "commit/100".
+struct Peer {
+    std::string bench;
+    double limit = 0; ///< largest ratio that reaches the goal; 0: told only, no goal is set
+    double extra = 0; ///< added to the peer's time, in the bench's unit
 };
 
-/// Runs the benches that the command line selects and prints the goals' table from the medians.
-/// Answers the process's exit status: 1 when a goal was missed.
-int run_with_goals(int argc, char **argv, const std::vector<Goal> &goals);
+struct GoalRow {
+    std::string label;
+    std::string bench;
+    std::vector<Peer> peers; ///< one for each of the table's peer columns; unnamed: an empty cell
+};
+
+struct GoalTable {
+    std::string text;         ///< what is measured, and what the goal is
+    std::string heading;      ///< of the labels' column
+    std::string bench_column; ///< what is measured
+    std::vector<std::string> peer_columns;
+    std::vector<GoalRow> rows;
+};
+
+struct GoalReport {
+    std::string title;
+    std::vector<GoalTable> tables;
+};
+
+/// Runs the benches that the command line selects, the repetitions of all of them in random order,
+/// and prints the report from the medians. Answers the process's exit status: 1 when a goal was
+/// missed.
+int run_with_goals(int argc, char **argv, const GoalReport &report);
 
 } // namespace ovbench
