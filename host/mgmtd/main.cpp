@@ -10,6 +10,7 @@
 #include "host/mgmtd/peer_sessions.h"
 #include "host/mgmtd/private_root.h"
 #include "host/mgmtd/requests.h"
+#include "host/support/standard_fds.h"
 
 #include <cstdio>
 #include <optional>
@@ -60,6 +61,7 @@ void run(const DaemonOptions &options)
 
 int main(int argc, char **argv)
 {
+    ovhost::fill_standard_fds();
     int exit_code = 0;
     const auto options = parse_options(argc, argv, exit_code);
     if (!options) {

@@ -1,14 +1,14 @@
 #include "host/modules/default_values.h"
 
 #include "framework/appliance.h"
-#include "framework/files.h"
-#include "host/modules/load_text.h"
-#include "host/modules/node_access.h"
-#include "orvale/md_db_default.h"
+#include "framework/logging.h"
+#include "host/framework/conf_file.h"
+#include "host/framework/log_config.h"
+#include "host/support/printable.h"
 
-#include <cstdlib>
-#include <span>
-#include <utility>
+#include <algorithm>
+#include <iterator>
+#include <string_view>
 #include <vector>
 
 namespace ovhost
@@ -31,45 +31,32 @@ const Edit compiled_in_defaults[] = {
     {"/ov/tunneld/system/config/limits/nm_ram_size", bt_uint32, "128"},
 };
 
-/// An array that the library has handed out.
-struct EntryArray {
-    bn_str_value *entries = nullptr;
-    uint32 count = 0;
-
-    EntryArray() = default;
-    EntryArray(const EntryArray &) = delete;
-    EntryArray &operator=(const EntryArray &) = delete;
-    ~EntryArray()
-    {
-        if (count != 0) {
-            (void)bn_str_value_free(&entries, count);
-        } else {
-            std::free(entries); // the library leaves an array of no good entries to its owner
-        }
-    }
-
-    [[nodiscard]] std::span<const bn_str_value> view() const { return {entries, count}; }
-};
-
 int read_preserved(bn_str_value **values, uint32 *num_values, bn_str_value **removals,
                    uint32 *num_removals)
 {
     return db_preserved_get_all(values, num_values, removals, num_removals, false);
 }
 
+int move_preserved(bn_str_value **values, uint32 *num_values, bn_str_value **removals,
+                   uint32 *num_removals)
+{
+    return db_preserved_get_all(values, num_values, removals, num_removals, true);
+}
+
 struct FileSource {
     const char *name;
     /// Where the library finds it; for the model, what the model's name is appended to.
     const char *path;
-    int (*read)(bn_str_value **, uint32 *, bn_str_value **, uint32 *);
+    DefaultFile::Reader read;
     bool is_model;
 };
 
-constexpr FileSource file_sources[] = {
-    {"model defaults", "/opt/orvale/defdb.conf.", db_model_def_get_all, true},
-    {"debugging defaults", "/var/opt/tms/.debug_default_db", db_default_get_all, false},
-    {"preserved values", "/var/opt/tms/.preserved_db", read_preserved, false},
-};
+constexpr FileSource model_source = {"model defaults", "/opt/orvale/defdb.conf.",
+                                     db_model_def_get_all, true};
+constexpr FileSource debug_source = {"debugging defaults", "/var/opt/tms/.debug_default_db",
+                                     db_default_get_all, false};
+constexpr FileSource preserved_source = {"preserved values", "/var/opt/tms/.preserved_db",
+                                         read_preserved, false};
 
 std::string path_of(const FileSource &source)
 {
@@ -77,48 +64,27 @@ std::string path_of(const FileSource &source)
     return std::string(source.path) + (model != nullptr ? model : "");
 }
 
-/// The lines of a file as the library reads them; none when it cannot be read.
-std::string read_lines(const std::string &path)
+/// Fit for a terminal: what is wrong with a text may be what it would do there.
+std::string describe(const LineFault &fault)
 {
-    tstr_array *read = nullptr;
-    (void)lf_read_file_lines(path.c_str(), &read);
-    const TstrArrayPtr lines(read);
-    const int32 count = read != nullptr ? tstr_array_length_quick(read) : 0;
-    std::string text;
-    for (int32 i = 0; i < count; ++i) {
-        text.append(tstr_array_get_str_quick(read, static_cast<uint32>(i))).append("\n");
-    }
-    return text;
+    return printable("line " + std::to_string(fault.line) + ": " +
+                     (fault.node.empty() ? "" : fault.node + ": ") + fault.message);
 }
 
-/// Every line of a file that is no good, and why. The library logs a code for each of them and
-/// answers that of the last line alone, which neither finds a bad line in the middle nor tells its
-/// number.
-std::vector<std::string> find_faults(const std::string &path)
-{
-    Candidate scratch;
-    std::vector<std::string> faults;
-    for (const LineFault &fault : load_text(scratch, read_lines(path)).faults) {
-        faults.push_back("line " + std::to_string(fault.line) + ": " +
-                         (fault.node.empty() ? "" : fault.node + ": ") + fault.message);
-    }
-    return faults;
-}
-
-void report_faults(const FileSource &source, const std::vector<std::string> &faults,
+void report_faults(const FileSource &source, const std::vector<LineFault> &faults,
                    const DefaultsReport &report)
 {
     const std::string path = path_of(source);
     if (!source.is_model) {
-        for (const std::string &fault : faults) {
-            report.warning(path + ", " + fault + "; left out");
+        for (const LineFault &fault : faults) {
+            report.warning(path + ", " + describe(fault) + "; left out");
         }
         return;
     }
     if (!faults.empty()) {
         std::string message = path + " has faults; mend it and start again";
-        for (const std::string &fault : faults) {
-            message += "\n  " + fault;
+        for (const LineFault &fault : faults) {
+            message += "\n  " + describe(fault);
         }
         throw DefaultsError(message);
     }
@@ -126,41 +92,34 @@ void report_faults(const FileSource &source, const std::vector<std::string> &fau
 
 /// The library takes a model's file that is missing, or may not be used, for one without values. To
 /// a daemon that was told its model it is a fault: the store would begin with half the appliance.
-void check_model_file(const FileSource &source)
+void check_model_file(const std::string &path)
 {
-    if (!source.is_model || get_config_name() == nullptr) {
-        return;
-    }
-    const std::string path = path_of(source);
-    if (!conf_file_okay(path.c_str())) {
-        throw DefaultsError("the model's default file " + path +
-                            " cannot be used (the log says why); mend it or name another --model");
+    if (const auto reason = conf_file_refusal(path.c_str())) {
+        throw DefaultsError("the model's default file " + path + " cannot be used: " + *reason +
+                            "; mend it or name another --model");
     }
 }
 
 /// Values first: what a file removes is gone whatever else it says.
 void apply_source(const FileSource &source, Candidate &candidate, const DefaultsReport &report)
 {
-    check_model_file(source);
-    EntryArray values;
-    EntryArray removals;
-    const int err = source.read(&values.entries, &values.count, &removals.entries, &removals.count);
-    std::vector<std::string> faults;
-    if (err != 0 || values.count != 0 || removals.count != 0) {
-        faults = find_faults(path_of(source));
-    }
-    if (err != 0 && faults.empty()) {
-        faults.push_back("the file cannot be read (error code " + std::to_string(err) + ")");
-    }
-    report_faults(source, faults, report);
     DefaultsSummary summary{source.name, 0, 0};
-    for (const bn_str_value &value : values.view()) {
-        // A value that does not fit was among the faults.
-        summary.set += !candidate.set(value.bv_name, value.bv_type, value.bv_value).has_value();
+    if (source.is_model && get_config_name() == nullptr) {
+        report.summary(summary);
+        return;
     }
-    for (const bn_str_value &removal : removals.view()) {
+    const std::string path = path_of(source);
+    if (source.is_model) {
+        check_model_file(path);
+    }
+    const DefaultFile file(path, source.read);
+    report_faults(source, file.faults(), report);
+    for (const auto &[line, value] : file.values()) {
+        summary.set += !candidate.set(value->bv_name, value->bv_type, value->bv_value).has_value();
+    }
+    for (const auto &[line, removal] : file.removals()) {
         // A node that is not there needs no removing.
-        summary.removed += !candidate.erase(removal.bv_name).has_value();
+        summary.removed += !candidate.erase(removal->bv_name).has_value();
     }
     report.summary(summary);
 }
@@ -179,18 +138,42 @@ void apply_compiled_in(Candidate &candidate, const DefaultsReport &report)
 void apply_default_values(Candidate &candidate, const DefaultsReport &report)
 {
     apply_compiled_in(candidate, report);
-    for (const FileSource &source : file_sources) {
-        apply_source(source, candidate, report);
+    for (const FileSource *source : {&model_source, &debug_source, &preserved_source}) {
+        apply_source(*source, candidate, report);
     }
+}
+
+std::optional<std::string> model_name_fault(const std::string &name)
+{
+    // The library has room for so much of the path, and takes the rest for no part of it.
+    constexpr std::size_t longest_path = 127;
+    const std::size_t longest = longest_path - std::string_view(model_source.path).size();
+    const bool has_bad_character = std::ranges::any_of(name, [](unsigned char character) {
+        return character == '/' || character < 0x20 || character == 0x7f;
+    });
+    if (!name.empty() && name.size() <= longest && !has_bad_character) {
+        return std::nullopt;
+    }
+    return "a model's name is 1 to " + std::to_string(longest) +
+           " bytes long, without slashes and control characters";
 }
 
 void retire_preserved_values()
 {
-    EntryArray values;
-    EntryArray removals;
-    // Read once more for the sake of the move; a bad line was reported the first time.
-    (void)db_preserved_get_all(&values.entries, &values.count, &removals.entries, &removals.count,
-                               true);
+    const std::string path = path_of(preserved_source);
+    const auto warn = [](const std::string &text) { log_host_line(ov_log_warning, "mgmtd", text); };
+    try {
+        const DefaultFile file(path, read_preserved);
+        if (!file.faults().empty()) {
+            warn(path + " stays where it is, for lines of it were left out: set what they were to "
+                        "say with ovctl, then remove it");
+            return;
+        }
+        // Read once more for the sake of the move.
+        const DefaultFile moved(path, move_preserved);
+    } catch (const DefaultsError &error) {
+        warn(error.what());
+    }
 }
 
 } // namespace ovhost

@@ -4,21 +4,15 @@
 // win, and their removals take away what earlier ones have set.
 
 #include "host/commit/candidate.h"
+#include "host/modules/default_file.h"
 
 #include <cstddef>
 #include <functional>
-#include <stdexcept>
+#include <optional>
 #include <string>
 
 namespace ovhost
 {
-
-/// A source that cannot be used; the message names it and says what to do.
-class DefaultsError : public std::runtime_error
-{
-  public:
-    using std::runtime_error::runtime_error;
-};
 
 /// What one source has contributed.
 struct DefaultsSummary {
@@ -34,13 +28,17 @@ struct DefaultsReport {
     std::function<void(const std::string &)> warning;
 };
 
-/// Applies all sources to the candidate. Throws DefaultsError, with every bad line, when the model's
-/// file has a fault: an appliance with half of its model's defaults is worse than one that does not
-/// start.
+/// Why there can be no default file of a model with this name; nothing when there can.
+[[nodiscard]] std::optional<std::string> model_name_fault(const std::string &name);
+
+/// Applies all sources to the candidate. Throws DefaultsError when a file that is there cannot be
+/// read, and, with every bad line, when the model's file has a fault: an appliance with half of its
+/// model's defaults is worse than one that does not start.
 void apply_default_values(Candidate &candidate, const DefaultsReport &report);
 
 /// Moves the preserved values aside. To be called once they are stored: until then the file is the
-/// only place that has them.
+/// only place that has them. It stays, with a warning in the log, when lines of it were left out:
+/// for these it still is the only place.
 void retire_preserved_values();
 
 } // namespace ovhost

@@ -1,8 +1,8 @@
 #include "host/modules/load_text.h"
 
 #include "host/modules/node_access.h"
+#include "host/support/utf8.h"
 #include "host/tree/name.h"
-#include "orvale/ov_defdb_line.h"
 
 #include <optional>
 
@@ -21,32 +21,51 @@ std::string unknown_type(const ov_defdb_field &type)
     return "unknown type \"" + to_string(type) + "\"";
 }
 
-/// One entry line applied; answers what is wrong with it.
-std::optional<std::string> apply_value(Candidate &candidate, const ov_defdb_fields &fields)
+/// The fields of a line that is no comment.
+ov_defdb_fields fields_of(const char *start)
 {
-    if (fields.name.length == 0 || fields.type.length == 0) {
-        return "a value line needs a name and a type: NAME,TYPE,VALUE";
-    }
-    const std::optional<bn_type> type = find_type(to_string(fields.type));
-    if (!type) {
-        return unknown_type(fields.type);
-    }
-    return candidate.set(to_string(fields.name), *type, to_string(fields.value));
+    return ov_defdb_split(ov_defdb_kind(start) == ov_defdb_value ? start : start + 1);
 }
 
-std::optional<std::string> apply_removal(Candidate &candidate, const ov_defdb_fields &fields)
+/// Why a line is no entry, whatever its name and value say.
+std::optional<std::string> form_fault(ov_defdb_line_kind kind, const ov_defdb_fields &fields)
 {
+    const bool is_value = kind == ov_defdb_value;
+    if (is_value && (fields.name.length == 0 || fields.type.length == 0)) {
+        return "a value line needs a name and a type: NAME,TYPE,VALUE";
+    }
     if (fields.name.length == 0) {
         return "a removal line needs a name: -NAME";
     }
     if (fields.type.length != 0 && !find_type(to_string(fields.type))) {
         return unknown_type(fields.type);
     }
-    const auto parts = split_name(to_string(fields.name));
+    return std::nullopt;
+}
+
+std::optional<std::string> apply_removal(Candidate &candidate, const std::string &name)
+{
+    const auto parts = split_name(name);
     if (!parts || candidate.tree().exists(*parts)) {
-        return candidate.erase(to_string(fields.name));
+        return candidate.erase(name);
     }
     return std::nullopt;
+}
+
+/// One entry line applied; answers what is wrong with it.
+std::optional<std::string> apply_entry(Candidate &candidate, ov_defdb_line_kind kind,
+                                       const ov_defdb_fields &fields)
+{
+    if (auto fault = form_fault(kind, fields)) {
+        return fault;
+    }
+    const std::string name = to_string(fields.name);
+    if (!is_utf8(name)) {
+        return "the node's name is not UTF-8: convert the file first";
+    }
+    return kind == ov_defdb_value
+               ? candidate.set(name, *find_type(to_string(fields.type)), to_string(fields.value))
+               : apply_removal(candidate, name);
 }
 
 /// A fault names its node beside the message, where some messages begin with it too.
@@ -66,17 +85,29 @@ void apply_line(Candidate &candidate, const std::string &line, long number, Load
     if (kind == ov_defdb_comment) {
         return;
     }
-    const bool is_value = kind == ov_defdb_value;
-    const ov_defdb_fields fields = ov_defdb_split(is_value ? start : start + 1);
-    if (auto fault = is_value ? apply_value(candidate, fields) : apply_removal(candidate, fields)) {
+    if (line.back() == '\r') {
+        result.faults.push_back({number, "",
+                                 "the line ends with a carriage return: save the file with plain "
+                                 "line ends"});
+        return;
+    }
+    const ov_defdb_fields fields = fields_of(start);
+    if (auto fault = apply_entry(candidate, kind, fields)) {
         const std::string name = to_string(fields.name);
         result.faults.push_back({number, name, without_name(*std::move(fault), name)});
         return;
     }
-    ++(is_value ? result.set : result.removed);
+    ++(kind == ov_defdb_value ? result.set : result.removed);
 }
 
 } // namespace
+
+ov_defdb_line_kind entry_kind(const char *line)
+{
+    const char *const start = ov_defdb_line_start(line);
+    const ov_defdb_line_kind kind = ov_defdb_kind(start);
+    return kind == ov_defdb_comment || form_fault(kind, fields_of(start)) ? ov_defdb_comment : kind;
+}
 
 LoadResult load_text(Candidate &candidate, std::string_view text)
 {

@@ -2,6 +2,7 @@
 // A text in the format of the default databases (orvale/md_db_default.h) as edits of a candidate.
 
 #include "host/commit/candidate.h"
+#include "orvale/ov_defdb_line.h"
 
 #include <string>
 #include <string_view>
@@ -24,6 +25,10 @@ struct LoadResult {
     std::size_t removed = 0;
     std::vector<LineFault> faults;
 };
+
+/// What the readers of the default databases make of a line, which to them ends at a NUL byte: an
+/// entry of this kind. One that they leave out counts as a comment.
+[[nodiscard]] ov_defdb_line_kind entry_kind(const char *line);
 
 /// Applies the text to the candidate, or leaves the candidate alone when any line has a fault; then
 /// all of them are told. Removing a node that is not there is no fault.

@@ -60,13 +60,9 @@ class FirstStart : public E2eTest
     {
         const Outcome outcome = run_daemon({"--model", "branch-100"});
         EXPECT_EQ(outcome.exit_code, 1);
-        EXPECT_THAT(outcome.err,
-                    HasSubstr("configuration file /opt/orvale/defdb.conf.branch-100 is not used: " +
-                              reason + "\n"));
-        EXPECT_THAT(outcome.err,
-                    HasSubstr("\nmgmtd: the model's default file /opt/orvale/defdb.conf.branch-100 "
-                              "cannot be used (the log says why); mend it or name another "
-                              "--model\n"));
+        EXPECT_THAT(outcome.err, HasSubstr("mgmtd: the model's default file /opt/orvale/"
+                                           "defdb.conf.branch-100 cannot be used: " +
+                                           reason + "; mend it or name another --model\n"));
         start({});
         EXPECT_EQ(mode(), "/ov/tunneld/system/config/mode string bridge\n");
     }
@@ -172,12 +168,38 @@ TEST_F(FirstStart, EndsOnValuesThatAModuleRefuses)
                              "/ov/model/limits/max_tunnels,string,many\n");
     const Outcome outcome = run_daemon({"--model", "branch-100"});
     EXPECT_EQ(outcome.exit_code, 1);
-    EXPECT_THAT(outcome.err,
-                HasSubstr("mgmtd: the first configuration is refused\n"
-                          "  /ov/model/limits/max_tunnels: must be of type uint32 (schema)\n"
-                          "  /ov/tunneld/system/config/mode: must be bridge, router or server, not "
-                          "\"brigde\" (schema)\n"));
+    EXPECT_THAT(
+        outcome.err,
+        HasSubstr("mgmtd: /opt/orvale/defdb.conf.branch-100 has faults; mend it and start again\n"
+                  "  line 1: /ov/tunneld/system/config/mode: must be bridge, router or server, not "
+                  "\"brigde\"\n"
+                  "  line 2: /ov/model/limits/max_tunnels: must be of type uint32\n"));
     EXPECT_FALSE(exists(socket_));
+}
+
+TEST_F(FirstStart, EndsOnAPipeInTheDebugFilesPlace)
+{
+    const std::string path = root_ + "/var/opt/tms/.debug_default_db";
+    fs::create_directories(fs::path(path).parent_path());
+    ASSERT_EQ(::mkfifo(path.c_str(), 0600), 0);
+    const Outcome outcome = run_daemon();
+    EXPECT_EQ(outcome.exit_code, 1);
+    EXPECT_THAT(outcome.err,
+                HasSubstr("mgmtd: /var/opt/tms/.debug_default_db cannot be read: it is "
+                          "not a regular file; "));
+}
+
+TEST_F(FirstStart, KeepsItsLogOutOfItsFilesWhenTheStandardDescriptorsAreClosed)
+{
+    Words words{"/bin/sh", "-c", R"(exec "$0" "$@" <&- >&- 2>&-)"};
+    const Words daemon = daemon_words();
+    words.insert(words.end(), daemon.begin(), daemon.end());
+    daemon_ = std::make_unique<Process>(words);
+    ASSERT_TRUE(eventually([this] { return ovctl({"status"}).exit_code == 0; }));
+    EXPECT_THAT(read_file(state_ + "/lock"), testing::MatchesRegex("[0-9]+\n"));
+    EXPECT_EQ(stop(SIGTERM), 0);
+    start();
+    EXPECT_EQ(mode(), "/ov/tunneld/system/config/mode string bridge\n");
 }
 
 TEST_F(FirstStart, LeavesOutBadLinesOfTheOtherFiles)

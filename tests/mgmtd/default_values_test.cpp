@@ -5,6 +5,7 @@
 
 #include <sys/stat.h>
 
+#include <algorithm>
 #include <filesystem>
 
 namespace
@@ -15,6 +16,7 @@ using namespace ovhost;
 using namespace mgmtd_test;
 using testing::Contains;
 using testing::ElementsAre;
+using testing::HasSubstr;
 using testing::IsEmpty;
 using testing::Not;
 
@@ -46,14 +48,11 @@ class DefaultValues : public DaemonTest
         return "none";
     }
 
-    /// The named model's file stops the start, and the log says why.
+    /// The named model's file stops the start, which says why whatever the log level is.
     void expect_unusable_model_file(const std::string &reason)
     {
-        EXPECT_EQ(fault(), "the model's default file /opt/orvale/defdb.conf.m1 cannot be used (the "
-                           "log says why); mend it or name another --model");
-        ASSERT_EQ(log_.lines.size(), 1U);
-        EXPECT_EQ(log_.lines[0].text,
-                  "configuration file /opt/orvale/defdb.conf.m1 is not used: " + reason);
+        EXPECT_EQ(fault(), "the model's default file /opt/orvale/defdb.conf.m1 cannot be used: " +
+                               reason + "; mend it or name another --model");
     }
 
     std::string value(const std::string &name) const { return value_in(candidate_.tree(), name); }
@@ -198,13 +197,101 @@ TEST_F(DefaultValues, LeaveOutBadLinesOfTheOtherFiles)
                                         "debugging defaults 2/0", "preserved values 1/0"));
 }
 
-TEST_F(DefaultValues, WarnOfAFileThatCannotBeRead)
+TEST_F(DefaultValues, NeedEveryFileThatIsThereToBeReadable)
 {
-    fs::create_directory(debug_file);
+    for (const char *file : {debug_file, preserved_file}) {
+        fs::create_directory(file);
+        EXPECT_EQ(fault(), std::string(file) +
+                               " cannot be read: it is not a regular file; mend that, or move it "
+                               "away, and start again");
+        fs::remove(file);
+        // Nobody ever writes to it: waiting for that would last for ever.
+        ASSERT_EQ(::mkfifo(file, 0600), 0);
+        EXPECT_THAT(fault(), HasSubstr("it is not a regular file"));
+        fs::remove(file);
+        fs::create_symlink(fs::path(file).filename(), file);
+        EXPECT_EQ(fault(), std::string(file) +
+                               " cannot be read: Too many levels of symbolic links; mend that, or "
+                               "move it away, and start again");
+        fs::remove(file);
+    }
+    EXPECT_EQ(fault(), "none");
+}
+
+TEST_F(DefaultValues, LeaveOutLinesWithNulBytesAndNamesThatAreNotUtf8)
+{
+    using namespace std::string_literals;
+    // To the library nearly all of them are good entries.
+    write_file(debug_file, "/x/a,string,1\n/x/a,string,2\0two\n/x/b,string\0,1\n/x/\xff,string,1\n"
+                           "-/x/c\0\n/x/c,string,3\n-/x/\xff\n/x/caf\xc3\xa9,string,\xe9\n"s);
     apply();
-    EXPECT_THAT(warnings_, ElementsAre("/var/opt/tms/.debug_default_db, the file cannot be read "
-                                       "(error code 14014); left out"));
-    EXPECT_EQ(value(mode_node), "string bridge");
+    EXPECT_EQ(value("/x/a"), "string 1");
+    EXPECT_EQ(value("/x/b"), "none");
+    EXPECT_EQ(value("/x/\xff"), "none");
+    EXPECT_EQ(value("/x/c"), "string 3");
+    EXPECT_EQ(value("/x/caf\xc3\xa9"), "string \xe9");
+    const std::string at = "/var/opt/tms/.debug_default_db, line ";
+    EXPECT_THAT(
+        warnings_,
+        ElementsAre(at + "2: the line holds a NUL byte; left out",
+                    at + "3: the line holds a NUL byte; left out",
+                    at + "4: /x/\xff: the node's name is not UTF-8: convert the file first; left "
+                         "out",
+                    at + "5: the line holds a NUL byte; left out",
+                    at + "7: /x/\xff: the node's name is not UTF-8: convert the file first; left "
+                         "out"));
+    EXPECT_THAT(summaries_, Contains("debugging defaults 3/0"));
+}
+
+TEST_F(DefaultValues, LeaveOutLinesThatEndWithACarriageReturn)
+{
+    write_file(preserved_file, "/x/a,string,1\r\n/x/b,string,2\n");
+    apply();
+    EXPECT_EQ(value("/x/a"), "none");
+    EXPECT_EQ(value("/x/b"), "string 2");
+    EXPECT_THAT(warnings_, ElementsAre("/var/opt/tms/.preserved_db, line 1: the line ends with a "
+                                       "carriage return: save the file with plain line ends; left "
+                                       "out"));
+}
+
+TEST_F(DefaultValues, LeaveOutWhatNoModuleTakes)
+{
+    // Without the last line about the mode, the one before it counts.
+    write_file(debug_file, "/ov/tunneld/system/config/mode,string,server\n"
+                           "/x/a,string,1\n"
+                           "/ov/tunneld/system/config/mode,string,brigde\n"
+                           "/ov/tunneld/system/config/limits/mem_size,string,much\n"
+                           "/ov/tunneld/system/config/mode,string,ruoter\n");
+    apply();
+    EXPECT_EQ(value(mode_node), "string server");
+    EXPECT_EQ(value("/x/a"), "string 1");
+    EXPECT_EQ(value("/ov/tunneld/system/config/limits/mem_size"), "uint32 2048");
+    const std::string at = "/var/opt/tms/.debug_default_db, line ";
+    EXPECT_THAT(
+        warnings_,
+        ElementsAre(at + "3: /ov/tunneld/system/config/mode: must be bridge, router or server, not "
+                         "\"brigde\"; left out",
+                    at + "4: /ov/tunneld/system/config/limits/mem_size: must be of type uint32; "
+                         "left out",
+                    at + "5: /ov/tunneld/system/config/mode: must be bridge, router or server, not "
+                         "\"ruoter\"; left out"));
+}
+
+TEST_F(DefaultValues, FailOnAValueOfTheModelFileThatNoModuleTakes)
+{
+    set_config_name("m1");
+    write_file(model_file, "/x/a,string,1\n/ov/tunneld/system/config/mode,string,brigde\n");
+    EXPECT_EQ(fault(), "/opt/orvale/defdb.conf.m1 has faults; mend it and start again\n"
+                       "  line 2: /ov/tunneld/system/config/mode: must be bridge, router or "
+                       "server, not \"brigde\"");
+}
+
+TEST_F(DefaultValues, ShowNoControlCharacters)
+{
+    set_config_name("m1");
+    write_file(model_file, "/x/\x1b[31m,nosuchtype,1\n");
+    EXPECT_EQ(fault(), "/opt/orvale/defdb.conf.m1 has faults; mend it and start again\n"
+                       "  line 1: /x/\\x1b[31m: unknown type \"nosuchtype\"");
 }
 
 // The first start of the daemon, where the values become durable.
@@ -271,24 +358,24 @@ TEST_F(FirstStart, StoresNothingWhenTheModelFileHasAFault)
     EXPECT_EQ(value_in(again.running(), "/x/preserved"), "string p");
 }
 
-TEST_F(FirstStart, StoresNothingWhenAModuleRefuses)
+TEST_F(FirstStart, KeepsPreservedValuesOfWhichSomeWereLeftOut)
 {
-    write_file(preserved_file, "/ov/tunneld/system/config/mode,string,brigde\n"
-                               "/ov/tunneld/system/config/limits/mem_size,string,much\n");
+    const std::string text = "/x/good,string,1\n/ov/tunneld/system/config/mode,string,brigde\n";
+    write_file(preserved_file, text);
     Configuration configuration(state_.path());
-    std::string message;
-    try {
-        configuration.start();
-    } catch (const std::runtime_error &error) {
-        message = error.what();
-    }
-    EXPECT_EQ(message,
-              "the first configuration is refused\n"
-              "  /ov/tunneld/system/config/limits/mem_size: must be of type uint32 (schema)\n"
-              "  /ov/tunneld/system/config/mode: must be bridge, router or server, not \"brigde\" "
-              "(schema)");
-    EXPECT_EQ(configuration.commit_number(), 0U);
-    EXPECT_TRUE(read_file(preserved_file));
+    configuration.start();
+    EXPECT_EQ(value_in(configuration.running(), "/x/good"), "string 1");
+    EXPECT_EQ(read_file(preserved_file), text);
+    EXPECT_FALSE(read_file("/var/opt/tms/.preserved_db.read"));
+    const std::string warning =
+        "warning /var/opt/tms/.preserved_db stays where it is, for lines of "
+        "it were left out: set what they were to say with ovctl, then "
+        "remove it";
+    const auto lines = daemon_log();
+    EXPECT_EQ(std::ranges::count(lines, warning), 1);
+    EXPECT_THAT(lines, Contains("warning /var/opt/tms/.preserved_db, line 2: /ov/tunneld/system/"
+                                "config/mode: must be bridge, router or server, not \"brigde\"; "
+                                "left out"));
 }
 
 TEST_F(FirstStart, TellsBadLinesInTheLog)

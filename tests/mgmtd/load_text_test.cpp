@@ -97,14 +97,25 @@ TEST_F(LoadText, TakesABlankBehindTheMinusForPartOfTheName)
                 ElementsAre(testing::StartsWith("1  /a|\" /a\" is not the name of ")));
 }
 
-TEST_F(LoadText, KeepsACarriageReturnInTheLastField)
+TEST_F(LoadText, RefusesACarriageReturnAtTheEndOfALine)
 {
-    EXPECT_THAT(load("/a,string,x\r\n/b,string,y,\r\n"), ElementsAre("2/0"));
-    EXPECT_THAT(nodes(), ElementsAre("/a string x\r", "/b string y"));
-    EXPECT_THAT(load("/c,uint32,5\r\n"),
-                ElementsAre("1 /c|\"5\\x0d\" is not a uint32: must be a decimal number from 0 to "
-                            "4294967295"));
-    EXPECT_THAT(load("/c,string\r\n"), ElementsAre("1 /c|unknown type \"string\r\""));
+    const std::string fault =
+        "|the line ends with a carriage return: save the file with plain line ends";
+    EXPECT_THAT(load("/a,string,x\r\n/b,string,y,\r\n/c,string\r\n-/d\r\n\r\n/e,string,z\r"),
+                ElementsAre("1 " + fault, "2 " + fault, "3 " + fault, "4 " + fault, "5 " + fault,
+                            "6 " + fault));
+    EXPECT_THAT(nodes(), IsEmpty());
+    // In a comment it does no harm, nor in the middle of a value.
+    EXPECT_THAT(load("# x\r\n/a,string,x\ry\n"), ElementsAre("1/0"));
+    EXPECT_THAT(nodes(), ElementsAre("/a string x\ry"));
+}
+
+TEST_F(LoadText, RefusesANameThatIsNotUtf8)
+{
+    EXPECT_THAT(load("/caf\xe9,string,x\n-/\xff\n"),
+                ElementsAre("1 /caf\xe9|the node's name is not UTF-8: convert the file first",
+                            "2 /\xff|the node's name is not UTF-8: convert the file first"));
+    EXPECT_THAT(load("/caf\xc3\xa9,string,x\n"), ElementsAre("1/0"));
 }
 
 TEST_F(LoadText, NamesEveryKindOfFaultWithItsLine)
