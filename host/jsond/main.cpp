@@ -3,8 +3,9 @@
 
 #include "host/jsond/peer.h"
 #include "host/jsond/signal_pipe.h"
-
-#include <CLI/CLI.hpp>
+#include "host/support/command_line.h"
+#include "host/support/standard_fds.h"
+#include "host/support/version.h"
 
 #include <csignal>
 #include <iostream>
@@ -35,21 +36,28 @@ int work(const ovhost::JsondOptions &options)
     return peer.run();
 }
 
-int run(int argc, char **argv)
+int run(int argc, char **argv, bool has_standard_output)
 {
     ovhost::JsondOptions options{.socket = "/run/mgmtd/control.sock", .output = {}, .retry = false};
     CLI::App app("Registers with mgmtd as the peer \"jsond\" and writes each event as a JSON line.",
                  "jsond");
     app.footer(footer);
+    app.set_version_flag("--version", ovhost::program_version());
     app.add_option("--socket", options.socket, "The control socket of mgmtd")
+        ->check(ovhost::not_empty())
         ->capture_default_str();
     app.add_option("--output", options.output,
-                   "The file events are appended to (standard output when not given)");
+                   "The file events are appended to (standard output when not given)")
+        ->check(ovhost::not_empty());
     app.add_flag("--retry", options.retry, "Wait for mgmtd, and come back when it went away");
     try {
         app.parse(argc, argv);
     } catch (const CLI::ParseError &error) {
         return app.exit(error) == 0 ? 0 : exit_usage;
+    }
+    if (options.output.empty() && !has_standard_output) {
+        report("standard output is closed: give a file with --output");
+        return exit_usage;
     }
     return work(options);
 }
@@ -58,8 +66,9 @@ int run(int argc, char **argv)
 
 int main(int argc, char **argv)
 {
+    const ovhost::StandardFds were_open = ovhost::fill_standard_fds();
     try {
-        return run(argc, argv);
+        return run(argc, argv, were_open.output);
     } catch (const std::exception &error) {
         report(error.what());
         return 1;

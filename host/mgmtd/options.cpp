@@ -1,6 +1,10 @@
 #include "host/mgmtd/options.h"
 
+#include "framework/logging.h"
 #include "host/framework/log_config.h"
+#include "host/modules/default_values.h"
+#include "host/support/command_line.h"
+#include "host/support/version.h"
 
 #include <CLI/CLI.hpp>
 
@@ -9,13 +13,21 @@ namespace ovhost
 namespace
 {
 
-/// A log level by its word or number.
+/// A log level by its word or number. Those graver than an error are not offered: nothing logs at
+/// them, and a daemon that does not even tell its errors is of no use.
 std::string level_fault(const std::string &text)
 {
-    return parse_log_level(text) ? ""
-                                 : "\"" + text +
-                                       "\" is not a log level: use error, warning, notice, info, "
-                                       "debug or a number from 3 to 7";
+    const std::optional<int> level = parse_log_level(text);
+    return level && *level >= ov_log_error
+               ? ""
+               : "\"" + text +
+                     "\" is not a log level: use error, warning, notice, info, debug or a number "
+                     "from 3 to 7";
+}
+
+std::string model_fault(const std::string &text)
+{
+    return model_name_fault(text).value_or("");
 }
 
 CLI::Option *add_level(CLI::App &app, const char *flag, int &level, const char *help)
@@ -34,14 +46,19 @@ std::optional<DaemonOptions> parse_options(int argc, char **argv, int &ret_exit_
     DaemonOptions options;
     CLI::App app("The management daemon: keeps the configuration, checks and applies commits.",
                  "mgmtd");
-    app.set_version_flag("--version", OVMD_VERSION);
+    app.set_version_flag("--version", program_version());
     app.add_option("--state-dir", options.state_dir, "Folder of the durable configuration")
+        ->check(not_empty())
         ->capture_default_str();
-    app.add_option("--socket", options.socket, "Control socket")->capture_default_str();
+    app.add_option("--socket", options.socket, "Control socket")
+        ->check(not_empty())
+        ->capture_default_str();
     app.add_option("--model", options.model,
-                   "Model of the appliance: names its default file, defdb.conf.MODEL");
+                   "Model of the appliance: names its default file, defdb.conf.MODEL")
+        ->check(CLI::Validator(model_fault, ""));
     app.add_option("--root", options.root,
-                   "Run in a private mount namespace with /opt/orvale and /var/opt/tms below DIR");
+                   "Run in a private mount namespace with /opt/orvale and /var/opt/tms below DIR")
+        ->check(not_empty());
     app.add_option("--peer-buffer", options.peer_buffer_mib,
                    "MiB of events that may wait for a peer before it is disconnected")
         ->check(CLI::Range(1, 4096))

@@ -1,11 +1,13 @@
 // ovctl: the client of mgmtd. options.h reads the command line, run.h does what it says.
 
 #include "host/ovctl/run.h"
+#include "host/support/standard_fds.h"
 
 #include <iostream>
 
 int main(int argc, char **argv)
 {
+    ovhost::fill_standard_fds();
     int exit_code = 0;
     const auto invocation = ovhost::read_command_line(argc, argv, std::cout, std::cerr, exit_code);
     if (!invocation)

@@ -1,8 +1,8 @@
 #include "host/ovctl/options.h"
 
 #include "host/ovctl/exit_code.h"
-
-#include <CLI/CLI.hpp>
+#include "host/support/command_line.h"
+#include "host/support/version.h"
 
 #include <cctype>
 #include <map>
@@ -35,6 +35,15 @@ std::string upper(std::string text)
     return text;
 }
 
+/// A number that is none compares with nothing: it is out of every range.
+std::string timeout_fault(const std::string &text)
+{
+    double seconds = 0;
+    const bool fits =
+        CLI::detail::lexical_cast(text, seconds) && seconds >= 0.001 && seconds <= 86400;
+    return fits ? "" : "must be a number of seconds from 0.001 to 86400";
+}
+
 class CommandLine
 {
   public:
@@ -42,6 +51,7 @@ class CommandLine
         : invocation_(invocation), app_("The client of mgmtd.", "ovctl")
     {
         app_.footer(footer);
+        app_.set_version_flag("--version", program_version());
         app_.require_subcommand(1);
         // Global options are taken after the command's name too.
         app_.fallthrough();
@@ -52,6 +62,16 @@ class CommandLine
 
     CLI::App &app() { return app_; }
 
+    /// The words of a command that there is none of; empty when it is not that.
+    [[nodiscard]] std::string unknown_command() const
+    {
+        const std::vector<std::string> rest = app_.remaining(true);
+        if (rest.empty() || rest.front().starts_with('-'))
+            return {};
+        const std::vector<CLI::App *> groups = app_.get_subcommands();
+        return (groups.empty() ? "" : groups.front()->get_name() + " ") + rest.front();
+    }
+
   private:
     void add_global_options()
     {
@@ -59,12 +79,13 @@ class CommandLine
         options.socket = "/run/mgmtd/control.sock";
         app_.add_option("--socket", options.socket, "The control socket of mgmtd")
             ->envname("OVCTL_SOCKET")
+            ->check(not_empty())
             ->capture_default_str();
         app_.add_flag("--json", options.json,
                       "Print one line of JSON for programs, {\"ok\":true,\"result\":...} or "
                       "{\"ok\":false,\"error\":...}");
         app_.add_option("--timeout", options.timeout_seconds, "Seconds to wait for the answer")
-            ->check(CLI::Range(0.001, 86400.0))
+            ->check(CLI::Validator(timeout_fault, ""))
             ->capture_default_str();
     }
 
@@ -140,6 +161,12 @@ std::optional<Invocation> read_command_line(int argc, const char *const *argv, s
     try {
         line.app().parse(argc, argv);
         return invocation;
+    } catch (const CLI::RequiredError &error) {
+        const std::string unknown = line.unknown_command();
+        err << (unknown.empty() ? error.what() : "there is no command \"" + unknown + "\"")
+            << "\nRun with --help for more information.\n";
+        exit_code = static_cast<int>(ExitCode::usage);
+        return std::nullopt;
     } catch (const CLI::ParseError &error) {
         const int code = line.app().exit(error, out, err);
         exit_code = static_cast<int>(code == 0 ? ExitCode::ok : ExitCode::usage);

@@ -4,6 +4,7 @@
 #include "host/control/message.h"
 #include "host/ovctl/render_error.h"
 #include "host/ovctl/text_input.h"
+#include "host/support/printable.h"
 
 #include <nlohmann/json.hpp>
 
@@ -56,6 +57,15 @@ void ask_and_print(const Invocation &invocation, std::ostream &out)
         command.render(result, out);
 }
 
+/// What is refused, with the file by the name that the user gave it.
+std::string subject_of(const Invocation &invocation)
+{
+    const auto file = invocation.arguments.find("file");
+    const std::string subject = invocation.command->subject;
+    const bool is_named = file != invocation.arguments.end() && file->second != "-";
+    return is_named ? subject + " " + printable(file->second) : subject;
+}
+
 } // namespace
 
 ExitCode run_command(const Invocation &invocation, std::ostream &out, std::ostream &err)
@@ -71,7 +81,7 @@ ExitCode run_command(const Invocation &invocation, std::ostream &out, std::ostre
         if (options.json)
             render_error_json(refusal, out);
         else
-            render_refusal(refusal, invocation.command->subject, err);
+            render_refusal(refusal, subject_of(invocation), err);
         return ExitCode::refused;
     } catch (const ClientError &error) {
         return fail(failure_of(error.kind()), error.what());

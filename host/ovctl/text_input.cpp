@@ -1,15 +1,16 @@
 #include "host/ovctl/text_input.h"
 
+#include "host/support/read_file.h"
 #include "host/support/unique_fd.h"
+#include "host/support/utf8.h"
 
 #include <fcntl.h>
 
 #include <algorithm>
-#include <array>
 #include <cerrno>
-#include <cstring>
 #include <optional>
 #include <string_view>
+#include <system_error>
 
 namespace ovhost
 {
@@ -17,46 +18,10 @@ namespace ovhost
 namespace
 {
 
-/// One row per form of a UTF-8 character: the range of its first byte, the number of bytes that
-/// follow, and the range of the second one, which keeps out overlong forms, surrogates and what is
-/// past U+10FFFF.
-struct Utf8Form {
-    unsigned char first_low;
-    unsigned char first_high;
-    unsigned char following;
-    unsigned char second_low;
-    unsigned char second_high;
-};
-
-constexpr Utf8Form utf8_forms[] = {
-    {0x00, 0x7f, 0, 0x00, 0x00}, {0xc2, 0xdf, 1, 0x80, 0xbf}, {0xe0, 0xe0, 2, 0xa0, 0xbf},
-    {0xe1, 0xec, 2, 0x80, 0xbf}, {0xed, 0xed, 2, 0x80, 0x9f}, {0xee, 0xef, 2, 0x80, 0xbf},
-    {0xf0, 0xf0, 3, 0x90, 0xbf}, {0xf1, 0xf3, 3, 0x80, 0xbf}, {0xf4, 0xf4, 3, 0x80, 0x8f},
-};
-
-/// Length of the character `text` starts with; 0 when it starts with none.
-std::size_t utf8_length(std::string_view text)
-{
-    const auto byte = [text](std::size_t at) { return static_cast<unsigned char>(text[at]); };
-    for (const Utf8Form &form : utf8_forms) {
-        if (byte(0) < form.first_low || byte(0) > form.first_high)
-            continue;
-        if (text.size() <= form.following)
-            return 0;
-        if (form.following > 0 && (byte(1) < form.second_low || byte(1) > form.second_high))
-            return 0;
-        for (std::size_t at = 2; at <= form.following; ++at)
-            if ((byte(at) & 0xc0) != 0x80)
-                return 0;
-        return form.following + std::size_t{1};
-    }
-    return 0;
-}
-
 std::optional<std::size_t> first_fault(std::string_view text)
 {
     for (std::size_t at = 0; at < text.size();) {
-        const std::size_t length = utf8_length(text.substr(at));
+        const std::size_t length = utf8_character_length(text.substr(at));
         if (length == 0)
             return at;
         at += length;
@@ -64,10 +29,13 @@ std::optional<std::size_t> first_fault(std::string_view text)
     return std::nullopt;
 }
 
-[[noreturn]] void fail_to_read(const std::string &file)
+[[noreturn]] void fail_to_read(const std::string &what, const std::error_code &cause)
 {
-    throw UsageError("cannot read " + file + ": " + std::strerror(errno));
+    throw UsageError("cannot read " + what + ": " + cause.message());
 }
+
+/// mgmtd takes no longer request.
+constexpr std::size_t longest_mib = 16;
 
 } // namespace
 
@@ -84,26 +52,24 @@ std::string checked_utf8(std::string text, const std::string &what)
 std::string read_text(const std::string &file)
 {
     const bool standard_input = file == "-";
+    const std::string what = standard_input ? "standard input" : file;
     UniqueFd opened;
     if (!standard_input) {
         opened = UniqueFd(::open(file.c_str(), O_RDONLY | O_CLOEXEC));
         if (!opened)
-            fail_to_read(file);
+            fail_to_read(what, {errno, std::generic_category()});
     }
-    const int fd = standard_input ? STDIN_FILENO : opened.get();
-    const std::string what = standard_input ? "standard input" : file;
-
+    constexpr std::size_t longest = longest_mib << 20;
     std::string text;
-    std::array<char, 65536> piece;
-    for (;;) {
-        const ssize_t got = ::read(fd, piece.data(), piece.size());
-        if (got == 0)
-            return checked_utf8(std::move(text), what);
-        if (got < 0 && errno != EINTR)
-            fail_to_read(what);
-        if (got > 0)
-            text.append(piece.data(), static_cast<std::size_t>(got));
+    try {
+        text = read_to_end(standard_input ? STDIN_FILENO : opened.get(), longest);
+    } catch (const std::system_error &error) {
+        fail_to_read(what, error.code());
     }
+    if (text.size() > longest)
+        throw UsageError(what + " is longer than " + std::to_string(longest_mib) +
+                         " MiB: load it in smaller parts");
+    return checked_utf8(std::move(text), what);
 }
 
 } // namespace ovhost

@@ -14,8 +14,8 @@ class UsageError : public std::runtime_error
     using std::runtime_error::runtime_error;
 };
 
-/// The whole text of a file, of standard input for "-". Throws UsageError when it cannot be read or
-/// is not UTF-8.
+/// The whole text of a file, of standard input for "-". Throws UsageError when it cannot be read,
+/// is longer than mgmtd takes or is not UTF-8.
 [[nodiscard]] std::string read_text(const std::string &file);
 
 /// `text`, when it is UTF-8: JSON carries nothing else, and a byte that changes on its way would

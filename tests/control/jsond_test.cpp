@@ -90,6 +90,38 @@ TEST_F(JsondTest, WithoutADaemonItEndsWithAReason)
                                "--socket? (--retry keeps trying)\n");
 }
 
+TEST_F(JsondTest, AClosedStandardOutputIsAnError)
+{
+    const auto closed = [this](const std::vector<std::string> &more) {
+        std::vector<std::string> words{"/bin/sh", "-c", R"(exec "$0" "$@" >&-)"};
+        for (const std::string &word : command(more))
+            words.push_back(word);
+        return words;
+    };
+    Process jsond(closed({}));
+    EXPECT_EQ(jsond.wait(), 2);
+    EXPECT_EQ(jsond.err(), "jsond: standard output is closed: give a file with --output\n");
+
+    TestServer server({}, {}, path_);
+    Process with_file(closed({"--output", dir_.path("events")}));
+    ASSERT_TRUE(wait_for_peer(server));
+    ASSERT_TRUE(server.send_to_peer("jsond", 1));
+    EXPECT_TRUE(eventually([&] { return read_file(dir_.path("events")) == "1\n"; }));
+}
+
+TEST_F(JsondTest, TellsItsVersionAndRefusesEmptyPaths)
+{
+    Process version({OVMD_JSOND, "--version"});
+    EXPECT_EQ(version.wait(), 0);
+    EXPECT_EQ(version.out(), "1.0.0\n");
+    for (const char *flag : {"--socket", "--output"}) {
+        Process jsond({OVMD_JSOND, flag, ""});
+        EXPECT_EQ(jsond.wait(), 2);
+        EXPECT_EQ(jsond.err(), std::string(flag) +
+                                   ": must not be empty\nRun with --help for more information.\n");
+    }
+}
+
 TEST_F(JsondTest, WhenTheDaemonGoesAwayItSaysSo)
 {
     TestServer server({}, {}, path_);

@@ -168,6 +168,33 @@ TEST_F(OvctlTest, AFileThatCannotBeReadIsNamed)
     EXPECT_TRUE(request().empty());
 }
 
+TEST_F(OvctlTest, AFileThatIsTooLongIsNotSent)
+{
+    const TempDir dir;
+    const std::string file = dir.path("site.db");
+    test::write_file(file, std::string(16UL << 20, '#'));
+    answer_with({{"set", 0}, {"removed", 0}});
+    // With what else is in the request this one is too long for mgmtd, which says so.
+    EXPECT_EQ(ask({"load", file}).exit, 1);
+    test::write_file(file, std::string((16UL << 20) + 1, '#'));
+    EXPECT_EQ(
+        ask({"load", file}),
+        (Outcome{2, "", "ovctl: " + file + " is longer than 16 MiB: load it in smaller parts\n"}));
+    EXPECT_EQ(
+        ask({"load", "/dev/zero"}),
+        (Outcome{2, "", "ovctl: /dev/zero is longer than 16 MiB: load it in smaller parts\n"}));
+}
+
+TEST_F(OvctlTest, ClosedStandardDescriptorsDoNotBecomeTheSocket)
+{
+    answer_with({{"removed", 2}});
+    for (const char *closed : {"<&-", ">&-", "2>&-", "<&- >&- 2>&-"}) {
+        Process process({"/bin/sh", "-c", std::string(R"(exec "$0" "$@" )") + closed, OVMD_OVCTL,
+                         "--socket", path(), "--json", "delete", "/a"});
+        EXPECT_EQ(process.wait(), 0) << closed << process.err();
+    }
+}
+
 TEST_F(OvctlTest, CheckSaysWhatACommitWouldDo)
 {
     answer_with({{"changes", 1}, {"warnings", {"mode changes"}}});
@@ -324,6 +351,18 @@ TEST_F(OvctlTest, ARefusedFileNamesItsLines)
                                                 "  line 12: /a: uint33 is no type\n"}));
 }
 
+TEST_F(OvctlTest, ARefusedFileIsNamedAsItWasGiven)
+{
+    const TempDir dir;
+    test::write_file(dir.path("site.db"), "x");
+    refuse_with({"bad-lines", "1 line is bad", {{"", "no type", "", 1}}});
+    EXPECT_EQ(ask({"load", dir.path("site.db")}),
+              (Outcome{1, "",
+                       "mgmtd refused the file " + dir.path("site.db") +
+                           ":\n"
+                           "  line 1: no type\n"}));
+}
+
 TEST_F(OvctlTest, ARefusalWithoutDetailsIsOneLine)
 {
     refuse_with({"not-found", "no node /a in the running configuration"});
@@ -403,15 +442,34 @@ TEST(OvctlWithoutDaemonTest, AWrongCommandLineIsAUsageError)
     EXPECT_EQ(run({}), (Outcome{2, "", "A subcommand is required\n" + hint}));
     EXPECT_EQ(run({"show"}), (Outcome{2, "", "A subcommand is required\n" + hint}));
     EXPECT_EQ(run({"get"}), (Outcome{2, "", "name is required\n" + hint}));
+    EXPECT_EQ(run({"fly"}), (Outcome{2, "", "there is no command \"fly\"\n" + hint}));
+    EXPECT_EQ(run({"--json", "fly", "/a"}),
+              (Outcome{2, "", "there is no command \"fly\"\n" + hint}));
+    EXPECT_EQ(run({"show", "fly"}), (Outcome{2, "", "there is no command \"show fly\"\n" + hint}));
+    EXPECT_EQ(
+        run({"--timeout", "nan", "status"}),
+        (Outcome{2, "", "--timeout: must be a number of seconds from 0.001 to 86400\n" + hint}));
     for (const std::vector<std::string> &words : {std::vector<std::string>{"fly"},
                                                   {"get", "/a", "--fast"},
                                                   {"get", "/a", "/b"},
-                                                  {"--timeout", "0", "status"}}) {
+                                                  {"--timeout", "0", "status"},
+                                                  {"--timeout", "nan", "status"},
+                                                  {"--timeout", "inf", "status"},
+                                                  {"--timeout", "-1", "status"},
+                                                  {"--timeout", "soon", "status"},
+                                                  {"--socket", "", "status"}}) {
         const Outcome outcome = run(words);
         EXPECT_EQ(outcome.exit, 2) << words[0];
         EXPECT_EQ(outcome.out, "");
         EXPECT_TRUE(outcome.err.ends_with(hint)) << outcome.err;
     }
+}
+
+TEST(OvctlWithoutDaemonTest, TellsItsVersion)
+{
+    const Outcome version = run({"--version"});
+    EXPECT_EQ(version.exit, 0);
+    EXPECT_EQ(version.out, "1.0.0\n");
 }
 
 TEST(OvctlWithoutDaemonTest, HelpListsCommandsExamplesAndExitCodes)

@@ -77,7 +77,7 @@ TEST(Options, KnowLevelsByWordAndNumber)
 TEST(Options, RefuseALevelThatIsNone)
 {
     for (const char *flag : {"--log-level", "--module-log-level"}) {
-        for (const char *word : {"loud", "8", "-1", "", "3x"}) {
+        for (const char *word : {"loud", "8", "-1", "", "3x", "0", "2", "emergency", "critical"}) {
             const Parsed parsed = parse({std::string(flag) + "=" + word});
             EXPECT_FALSE(parsed.options) << word;
             EXPECT_EQ(parsed.exit_code, 2) << word;
@@ -98,6 +98,35 @@ TEST(Options, RefuseWhatTheyDoNotKnow)
         EXPECT_FALSE(parsed.options) << words[0];
         EXPECT_EQ(parsed.exit_code, 2) << words[0];
         EXPECT_THAT(parsed.err, HasSubstr(words[0]));
+    }
+}
+
+TEST(Options, RefuseAPathThatIsEmpty)
+{
+    for (const std::string flag : {"--state-dir", "--socket", "--root", "--model"}) {
+        for (const std::vector<std::string> &words :
+             std::vector<std::vector<std::string>>{{flag, ""}, {flag + "="}}) {
+            const Parsed parsed = parse(words);
+            EXPECT_FALSE(parsed.options) << flag;
+            EXPECT_EQ(parsed.exit_code, 2) << flag;
+            EXPECT_THAT(parsed.err, HasSubstr(flag));
+        }
+    }
+    EXPECT_THAT(parse({"--root", ""}).err, HasSubstr("--root: must not be empty"));
+}
+
+TEST(Options, RefuseAModelThatNamesNoFile)
+{
+    const std::string longest(104, 'm');
+    EXPECT_EQ(parse({"--model", longest}).options->model, longest);
+    for (const std::string &model : {longest + "m", std::string("../m"), std::string("a/b"),
+                                     std::string("a\nb"), std::string("a\x7f")}) {
+        const Parsed parsed = parse({"--model", model});
+        EXPECT_FALSE(parsed.options) << model;
+        EXPECT_EQ(parsed.exit_code, 2) << model;
+        EXPECT_THAT(parsed.err,
+                    HasSubstr("--model: a model's name is 1 to 104 bytes long, without slashes and "
+                              "control characters"));
     }
 }
 
