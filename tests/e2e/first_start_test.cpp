@@ -189,9 +189,9 @@ TEST_F(FirstStart, EndsOnAPipeInTheDebugFilesPlace)
                           "not a regular file; "));
 }
 
-TEST_F(FirstStart, KeepsItsLogOutOfItsFilesWhenTheStandardDescriptorsAreClosed)
+TEST_F(FirstStart, KeepsItsLogOutOfItsFilesWhenStandardErrorIsClosed)
 {
-    Words words{"/bin/sh", "-c", R"(exec "$0" "$@" <&- >&- 2>&-)"};
+    Words words{"/bin/sh", "-c", R"(exec "$0" "$@" 2>&-)"};
     const Words daemon = daemon_words();
     words.insert(words.end(), daemon.begin(), daemon.end());
     daemon_ = std::make_unique<Process>(words);
