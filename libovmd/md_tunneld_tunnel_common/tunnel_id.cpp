@@ -21,18 +21,27 @@ tunnel_id_info *tunnel_ids;
 tunnel_id_info_q_t free_id_list;
 uint32_array *tunnel_sorted_seq;
 
-// One number for each ID, made from the name bound to it: a search by name passes over the IDs
-// whose number is another without looking at their records. It lies behind the records.
-uint32 *name_marks;
+// One byte for each ID, made from the name bound to it: a search by name passes over the IDs whose
+// byte is another without looking at their records. They lie behind the records.
+unsigned char *name_marks;
 uint32 num_records;
 
-uint32 mark_of(const tstring *name)
+unsigned char mark_of(const tstring *name)
 {
-    uint32 mark = 2166136261u;
+    uint32 hash = 2166136261u;
     for (const char *c = ts_str(name); c != nullptr && *c != '\0'; ++c) {
-        mark = (mark ^ static_cast<unsigned char>(*c)) * 16777619u;
+        hash = (hash ^ static_cast<unsigned char>(*c)) * 16777619u;
     }
-    return mark;
+    return static_cast<unsigned char>(hash >> 24); // where every character has left its trace
+}
+
+// The first ID from `from` on with the mark; `bound` when there is none.
+uint32 next_marked(unsigned char mark, uint32 from, uint32 bound)
+{
+    const void *const found = memchr(name_marks + from, mark, bound - from);
+    return found != nullptr
+               ? static_cast<uint32>(static_cast<const unsigned char *>(found) - name_marks)
+               : bound;
 }
 
 uint64 now_ms()
@@ -82,7 +91,7 @@ int md_init_tunnel_id(void)
     tunnel_ids =
         static_cast<tunnel_id_info *>(calloc(num_ids, sizeof *tunnel_ids + sizeof *name_marks));
     BAIL_NULL(tunnel_ids);
-    name_marks = reinterpret_cast<uint32 *>(tunnel_ids + num_ids);
+    name_marks = reinterpret_cast<unsigned char *>(tunnel_ids + num_ids);
     num_records = num_ids;
     for (uint32 id = 0; id < num_ids; ++id) {
         tunnel_ids[id].id = static_cast<uint16>(id);
@@ -208,10 +217,11 @@ int md_get_tunnel_id(const tstring *tun_name, uint32 *id)
     BAIL_NULL(id);
     BAIL_NULL(tunnel_ids);
 
-    const uint32 mark = mark_of(tun_name);
+    const unsigned char mark = mark_of(tun_name);
     const uint32 bound = get_max_tunnel_number();
-    for (uint32 candidate = 0; candidate < bound; ++candidate) {
-        if (name_marks[candidate] == mark && tunnel_ids[candidate].name != nullptr &&
+    for (uint32 candidate = next_marked(mark, 0, bound); candidate < bound;
+         candidate = next_marked(mark, candidate + 1, bound)) {
+        if (tunnel_ids[candidate].name != nullptr &&
             ts_equal(tunnel_ids[candidate].name, tun_name)) {
             *id = candidate;
             return 0;
