@@ -151,7 +151,7 @@ void add_bench(const char *operation, const char *table, const NameShape &shape,
         bench_name(operation, table, shape, size).c_str(),
         [&shape, size, measure](benchmark::State &state) { measure(state, shape, size); })
         ->MinTime(0.01)
-        ->Repetitions(9)
+        ->Repetitions(15)
         ->ReportAggregatesOnly();
 }
 
