@@ -2,6 +2,7 @@
 
 #include "framework/logging.h"
 #include "host/framework/log_config.h"
+#include "host/framework/objects.h"
 
 #include <algorithm>
 #include <exception>
@@ -72,6 +73,16 @@ void CommitEngine::load()
 {
     const BusyMark mark(busy_);
     running_ = load_tree(store_);
+}
+
+void CommitEngine::start_modules()
+{
+    const BusyMark mark(busy_);
+    mdb_db running;
+    running.tree = running_;
+    for (const RegisteredModule &registered : modules_) {
+        registered.module->start(&running);
+    }
 }
 
 CheckReport CommitEngine::check(const Candidate &candidate)

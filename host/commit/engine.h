@@ -43,6 +43,9 @@ class CommitEngine
     /// Makes the stored configuration the running one; modules are not called. Throws StoreError.
     void load();
 
+    /// Starts every module on the running configuration. What a module throws passes.
+    void start_modules();
+
     [[nodiscard]] const Tree &running() const { return running_; }
 
     /// A dry run: what a commit of the candidate would do. Runs the checks, then throws away what

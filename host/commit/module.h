@@ -49,6 +49,10 @@ class Module
     /// does. Asked once, when the module is registered.
     [[nodiscard]] virtual std::vector<std::string> patterns() const { return {}; }
 
+    /// Once before the first commit: takes up what is in force already. `running` is empty at the
+    /// very first start. Throws when the daemon cannot run without the module.
+    virtual void start(const mdb_db *) {}
+
     /// Phase "check", once for each change that concerns the module, parents before children. A
     /// change that a module has made in the new database is checked too, in the next round.
     /// Refuses by md_commit_set_return_status_msg, whatever it returns then; by a code other than

@@ -4,6 +4,8 @@
 
 #include <nlohmann/json.hpp>
 
+#include <limits>
+
 namespace ovhost
 {
 
@@ -37,6 +39,17 @@ std::string optional_text(const json &request, const char *name, const std::stri
     if (!given->is_string())
         refuse(request, name, "a string");
     return given->get<std::string>();
+}
+
+std::optional<std::uint32_t> optional_number(const json &request, const char *name)
+{
+    const auto given = request.find(name);
+    if (given == request.end() || given->is_null())
+        return std::nullopt;
+    constexpr auto largest = std::numeric_limits<std::uint32_t>::max();
+    if (!given->is_number_integer() || *given < 0 || *given > largest)
+        refuse(request, name, "a whole number from 0 to 4294967295");
+    return given->get<std::uint32_t>();
 }
 
 bool optional_flag(const json &request, const char *name, bool otherwise)

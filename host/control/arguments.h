@@ -5,6 +5,8 @@
 
 #include <nlohmann/json_fwd.hpp>
 
+#include <cstdint>
+#include <optional>
 #include <string>
 
 namespace ovhost
@@ -13,6 +15,9 @@ namespace ovhost
 [[nodiscard]] std::string required_text(const nlohmann::json &request, const char *name);
 [[nodiscard]] std::string optional_text(const nlohmann::json &request, const char *name,
                                         const std::string &otherwise = {});
+/// Nothing when it is not given.
+[[nodiscard]] std::optional<std::uint32_t> optional_number(const nlohmann::json &request,
+                                                           const char *name);
 [[nodiscard]] bool optional_flag(const nlohmann::json &request, const char *name,
                                  bool otherwise = false);
 

@@ -4,7 +4,9 @@
 #include "framework/logging.h"
 #include "host/framework/appliance_config.h"
 #include "host/framework/log_config.h"
+#include "host/framework/model_nodes.h"
 #include "host/modules/default_values.h"
+#include "host/modules/node_access.h"
 #include "orvale/md_dyna_limits.h"
 
 #include <stdexcept>
@@ -35,9 +37,22 @@ std::string describe(const CommitReport &report)
 {
     std::string text = "the first configuration is refused";
     for (const Refusal &refusal : report.refusals) {
-        text += "\n  " + refusal.node + ": " + refusal.message + " (" + refusal.module + ")";
+        text += "\n  " + (refusal.node.empty() ? "" : refusal.node + ": ") + refusal.message +
+                " (" + refusal.module + ")";
     }
     return report.outcome == CommitOutcome::not_stored ? report.store_error : text;
+}
+
+/// Defaults and limits would come from two models at the next first start.
+void warn_of_another_model(const mdb_db &configuration)
+{
+    const char *const in_force = get_config_name();
+    const std::optional<std::string> stored = node_text(&configuration, model_name_node);
+    if (in_force != nullptr && stored && *stored != in_force) {
+        log_line(ov_log_warning, "the configuration is of model \"" + *stored +
+                                     "\", --model is \"" + in_force +
+                                     "\": start without --model, or with the stored one");
+    }
 }
 
 } // namespace
@@ -47,6 +62,8 @@ Configuration::Configuration(const std::filesystem::path &state_dir)
 {
     // Order counts: checks refuse before anything follows, and events tell of what is done.
     engine_.add_module(schema_);
+    engine_.add_module(model_);
+    engine_.add_module(tunnels_);
     engine_.add_module(limits_);
     engine_.add_module(events_);
     engine_.load();
@@ -65,9 +82,23 @@ const mdb_db *Configuration::running_db()
     return &running_db_;
 }
 
-void Configuration::build_first()
+/// The modules start with the model that `configuration` describes: what they set up by it stays
+/// for the life of the process.
+void Configuration::start_modules(const Tree &configuration)
 {
-    apply_default_values(candidate_, logged_defaults());
+    mdb_db db;
+    db.tree = configuration;
+    if (const int err = init_model_info(&db); err != 0) {
+        throw std::runtime_error("the model's limits cannot be read from the configuration (error "
+                                 "code " +
+                                 std::to_string(err) + "): see the log for the node");
+    }
+    warn_of_another_model(db);
+    engine_.start_modules();
+}
+
+void Configuration::commit_first()
+{
     const CommitReport report = engine_.initial(candidate_);
     if (!report.accepted()) {
         throw std::runtime_error(describe(report));
@@ -84,12 +115,11 @@ void Configuration::build_first()
 void Configuration::start()
 {
     if (store_.empty()) {
-        build_first();
-    }
-    if (const int err = init_model_info(running_db()); err != 0) {
-        throw std::runtime_error("the model's limits cannot be read from the configuration (error "
-                                 "code " +
-                                 std::to_string(err) + "): see the log for the node");
+        apply_default_values(candidate_, logged_defaults());
+        start_modules(candidate_.tree());
+        commit_first();
+    } else {
+        start_modules(running());
     }
     // The file may have been lost while the daemon was away; the library logs why it fails.
     if (write_dyna_limits_conf(running_db()) != 0) {

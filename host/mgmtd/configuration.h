@@ -7,7 +7,9 @@
 #include "host/framework/objects.h"
 #include "host/modules/change_events.h"
 #include "host/modules/limits.h"
+#include "host/modules/model.h"
 #include "host/modules/schema.h"
+#include "host/modules/tunnels.h"
 #include "host/store/store.h"
 
 #include <cstdint>
@@ -27,8 +29,8 @@ class Configuration
     Configuration &operator=(const Configuration &) = delete;
 
     /// Builds the first configuration when the store is empty, and brings what follows the
-    /// configuration (model information, limits file) up to date. Throws std::runtime_error when
-    /// there is no configuration to run with.
+    /// configuration (model information, tunnels, limits file) up to date. Throws
+    /// std::runtime_error when there is no configuration to run with.
     void start();
 
     [[nodiscard]] const Tree &running() const { return engine_.running(); }
@@ -44,12 +46,18 @@ class Configuration
 
     [[nodiscard]] std::uint64_t commit_number() const { return store_.commit_number(); }
 
+    /// Tunnel IDs that were freed a short time ago.
+    [[nodiscard]] const HeldIds &held_ids() const { return tunnels_.held_ids(); }
+
   private:
-    void build_first();
+    void start_modules(const Tree &configuration);
+    void commit_first();
 
     Store store_;
     StoreAdapter adapter_;
     SchemaModule schema_;
+    ModelModule model_;
+    TunnelsModule tunnels_;
     LimitsModule limits_;
     ChangeEventsModule events_;
     CommitEngine engine_;

@@ -6,9 +6,10 @@
 #include "host/control/server.h"
 #include "host/framework/log_config.h"
 #include "host/framework/time_refresh.h"
+#include "host/mgmtd/show.h"
 #include "host/modules/load_text.h"
-#include "host/modules/mode.h"
 #include "host/modules/node_access.h"
+#include "host/support/version.h"
 #include "host/tree/name.h"
 
 #include <nlohmann/json.hpp>
@@ -73,19 +74,6 @@ std::size_t count_values(const Tree &tree, Tree::Parts below)
         details.push_back({refusal.node, refusal.message, refusal.module, 0});
     }
     throw RequestError(error_code::refused, what, std::move(details));
-}
-
-json mode_json(const ModeAnswers &answers)
-{
-    return {{"mode", answers.mode ? json(*answers.mode) : json()},
-            {"submode", answers.submode},
-            {"bridge", answers.bridge},
-            {"router", answers.router},
-            {"server", answers.server},
-            {"inline_router", answers.inline_router},
-            {"router_interfaces", answers.router_interfaces},
-            {"ten_gigabit", answers.ten_gigabit},
-            {"bonding", answers.bonding}};
 }
 
 } // namespace
@@ -254,7 +242,7 @@ json Requests::status(const json &)
     const auto uptime = std::chrono::duration_cast<std::chrono::seconds>(
         std::chrono::steady_clock::now() - started_);
     return {
-        {"version", OVMD_VERSION},
+        {"version", program_version()},
         {"pid", ::getpid()},
         {"model", model != nullptr ? json(model) : json()},
         {"commit", configuration_.commit_number()},
@@ -267,11 +255,7 @@ json Requests::status(const json &)
 
 json Requests::show(const json &request)
 {
-    const std::string what = required_text(request, "what");
-    if (what == "mode") {
-        return mode_json(ask_mode(configuration_.running_db()));
-    }
-    throw RequestError(error_code::unknown_command, "show: there is no \"" + what + "\" to show");
+    return answer_show(configuration_, request);
 }
 
 } // namespace ovhost

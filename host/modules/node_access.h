@@ -2,11 +2,14 @@
 // What modules need of nodes: the operations of framework/ with owners around what they hand out.
 
 #include "framework/mdb_db.h"
+#include "framework/typed_arrays.h"
 
 #include <cstdlib>
 #include <memory>
 #include <optional>
 #include <string>
+#include <string_view>
+#include <vector>
 
 namespace ovhost
 {
@@ -20,6 +23,11 @@ struct TstrArrayDeleter {
     void operator()(tstr_array *texts) const { tstr_array_free(&texts); }
 };
 using TstrArrayPtr = std::unique_ptr<tstr_array, TstrArrayDeleter>;
+
+struct Uint32ArrayDeleter {
+    void operator()(uint32_array *numbers) const { uint32_array_free(&numbers); }
+};
+using Uint32ArrayPtr = std::unique_ptr<uint32_array, Uint32ArrayDeleter>;
 
 struct BindingDeleter {
     void operator()(bn_binding *binding) const { bn_binding_free(&binding); }
@@ -36,6 +44,18 @@ using TextPtr = std::unique_ptr<char, TextDeleter>;
 
 /// A node; null when it is absent or cannot be read.
 [[nodiscard]] BindingPtr node_binding(const mdb_db *db, const char *name);
+
+/// The value of a node as text; nothing when it is absent or cannot be read.
+[[nodiscard]] std::optional<std::string> node_text(const mdb_db *db, const std::string &name);
+
+/// The names of a node's children, escapes resolved; none when they cannot be read.
+[[nodiscard]] std::vector<std::string> child_names(const mdb_db *db, const std::string &parent);
+
+/// A decimal number; nothing when the text is none or it is too large.
+[[nodiscard]] std::optional<uint32> parse_number(std::string_view text);
+
+/// A copy as the library takes it. Throws std::bad_alloc.
+[[nodiscard]] TstringPtr make_tstring(const std::string &text);
 
 /// The name of a type ("uint32"); its number when it has none.
 [[nodiscard]] std::string type_name(bn_type type);

@@ -27,6 +27,11 @@ constexpr NodeRule node_rules[] = {
     {"/ov/tunneld/system/config/10g", bt_bool, {}},
     {"/ov/tunneld/system/config/bonding", bt_bool, {}},
     {"/ov/tunneld/system/config/limits/*", bt_uint32, {}},
+    {"/ov/tunneld/tunnel/config/*", bt_string, {}},
+    {"/ov/tunneld/tunnel/config/*/alias", bt_string, {}},
+    {"/ov/tunneld/tunnel/config/*/id", bt_uint16, {}},
+    {"/ov/tunneld/tunnel/config/*/remote", bt_ipaddr, {}},
+    {"/ov/tunneld/tunnel/config/*/bandwidth", bt_uint32, {}},
     {"/ov/model/config/name", bt_string, {}},
     {"/ov/model/limits/*", bt_uint32, {}},
 };

@@ -1,6 +1,7 @@
 #include "host/ovctl/command_table.h"
 
 #include "host/ovctl/render.h"
+#include "host/ovctl/render_tunnels.h"
 #include "host/ovctl/text_input.h"
 
 #include <nlohmann/json.hpp>
@@ -40,7 +41,13 @@ constexpr ArgumentSpec load_arguments[] = {
 };
 
 constexpr ArgumentSpec commit_arguments[] = {
-    {text, "comment", "A remark kept with the commit"},
+    {text, "comment", "A remark for mgmtd's log"},
+};
+
+constexpr ArgumentSpec tunnel_arguments[] = {
+    {text, "name", "The tunnel of this name"},
+    {text, "alias", "The tunnel of this alias"},
+    {text, "id", "The tunnel of this ID"},
 };
 
 json no_arguments(const Arguments &)
@@ -84,6 +91,27 @@ json commit_request(const Arguments &arguments)
 json show_mode_request(const Arguments &)
 {
     return {{"what", "mode"}};
+}
+
+json show_tunnels_request(const Arguments &)
+{
+    return {{"what", "tunnels"}};
+}
+
+json show_tunnel_tables_request(const Arguments &)
+{
+    return {{"what", "tunnel-tables"}};
+}
+
+json show_tunnel_request(const Arguments &arguments)
+{
+    if (arguments.size() != 1)
+        throw UsageError("give one of --name, --alias and --id");
+    const auto &[key, value] = *arguments.begin();
+    // A request has an "id" of its own.
+    if (key == "id")
+        return {{"what", "tunnel"}, {"tunnel_id", checked_number(value, "the ID")}};
+    return {{"what", "tunnel"}, {key, checked_utf8(value, "the " + key)}};
 }
 
 constexpr Command table[] = {
@@ -139,6 +167,25 @@ constexpr Command table[] = {
      "show",
      show_mode_request,
      render_mode,
+     "the query"},
+    {"show tunnels",
+     "List all tunnels with their IDs, in the order of their names",
+     "ovctl show tunnels",
+     {},
+     "show",
+     show_tunnels_request,
+     render_tunnels,
+     "the query"},
+    {"show tunnel", "Find a tunnel by its name, its alias or its ID",
+     "ovctl show tunnel --alias hq", tunnel_arguments, "show", show_tunnel_request, render_tunnel,
+     "the query"},
+    {"show tunnel-tables",
+     "Print how full the tables of tunnel names, aliases and IDs are",
+     "ovctl show tunnel-tables",
+     {},
+     "show",
+     show_tunnel_tables_request,
+     render_tunnel_tables,
      "the query"},
 };
 

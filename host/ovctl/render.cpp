@@ -1,10 +1,10 @@
 #include "host/ovctl/render.h"
 
-#include "host/ovctl/printable.h"
+#include "host/ovctl/render_parts.h"
+#include "host/support/printable.h"
 
 #include <nlohmann/json.hpp>
 
-#include <iomanip>
 #include <ostream>
 
 namespace ovhost
@@ -15,21 +15,6 @@ using nlohmann::json;
 namespace
 {
 
-std::string text_of(const json &object, const char *member)
-{
-    return printable(object.at(member).get_ref<const std::string &>());
-}
-
-long count_of(const json &object, const char *member)
-{
-    return object.at(member).get<long>();
-}
-
-std::string counted(long count, const char *one, const char *many)
-{
-    return std::to_string(count) + " " + (count == 1 ? one : many);
-}
-
 std::string changes(long count)
 {
     return counted(count, "change", "changes");
@@ -39,17 +24,6 @@ void print_warnings(const json &result, std::ostream &out)
 {
     for (const json &warning : result.at("warnings"))
         out << "warning: " << printable(warning.get_ref<const std::string &>()) << '\n';
-}
-
-/// Names and values in two columns.
-void print_fact(std::ostream &out, const char *name, const std::string &value)
-{
-    out << std::left << std::setw(20) << name << value << '\n';
-}
-
-std::string text_or(const json &object, const char *member, const char *otherwise)
-{
-    return object.at(member).is_null() ? otherwise : text_of(object, member);
 }
 
 std::string yes_or_no(const json &object, const char *member)

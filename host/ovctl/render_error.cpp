@@ -1,7 +1,7 @@
 #include "host/ovctl/render_error.h"
 
 #include "host/control/message.h"
-#include "host/ovctl/printable.h"
+#include "host/support/printable.h"
 
 #include <nlohmann/json.hpp>
 

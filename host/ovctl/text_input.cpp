@@ -8,6 +8,7 @@
 
 #include <algorithm>
 #include <cerrno>
+#include <charconv>
 #include <optional>
 #include <string_view>
 #include <system_error>
@@ -47,6 +48,16 @@ std::string checked_utf8(std::string text, const std::string &what)
     const auto line =
         1 + std::count(text.begin(), text.begin() + static_cast<std::ptrdiff_t>(*fault), '\n');
     throw UsageError(what + " is not UTF-8 in line " + std::to_string(line) + ": convert it first");
+}
+
+std::uint32_t checked_number(const std::string &text, const std::string &what)
+{
+    std::uint32_t number = 0;
+    const char *const text_end = text.data() + text.size();
+    const auto [end, fault] = std::from_chars(text.data(), text_end, number);
+    if (fault != std::errc() || end != text_end)
+        throw UsageError(what + " must be a whole number from 0 to 4294967295");
+    return number;
 }
 
 std::string read_text(const std::string &file)

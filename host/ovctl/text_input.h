@@ -1,6 +1,7 @@
 #pragma once
 // Texts from the command line and from files, checked before they are sent.
 
+#include <cstdint>
 #include <stdexcept>
 #include <string>
 
@@ -21,5 +22,8 @@ class UsageError : public std::runtime_error
 /// `text`, when it is UTF-8: JSON carries nothing else, and a byte that changes on its way would
 /// end up in the configuration. Throws UsageError that names `what` and the line.
 [[nodiscard]] std::string checked_utf8(std::string text, const std::string &what);
+
+/// A whole number from 0 to 4294967295. Throws UsageError that names `what`.
+[[nodiscard]] std::uint32_t checked_number(const std::string &text, const std::string &what);
 
 } // namespace ovhost

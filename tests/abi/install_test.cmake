@@ -2,7 +2,7 @@
 # installed: once with the CMake package, once with pkg-config. Then the same with folders given as
 # absolute paths, as some distributions do.
 #
-#   cmake -DSOURCE_DIR=... -DWORK_DIR=... -DC_COMPILER=... -DCXX_COMPILER=... -DGENERATOR=...
+#   cmake -DSOURCE_DIR=... -DC_COMPILER=... -DCXX_COMPILER=... -DGENERATOR=...
 #     -DCONSUMER_DIR=... -P install_test.cmake
 
 set(compilers -G ${GENERATOR} -DCMAKE_C_COMPILER=${C_COMPILER} -DCMAKE_CXX_COMPILER=${CXX_COMPILER})
@@ -69,6 +69,10 @@ function(check_install name given_libdir given_includedir)
   expect_usable(${work_dir} ${libdir})
 endfunction()
 
-file(REMOVE_RECURSE ${WORK_DIR})
+# Outside the source tree, which may hold the build tree: an absolute folder for headers must not lie
+# in the sources.
+execute_process(COMMAND mktemp -d OUTPUT_VARIABLE WORK_DIR OUTPUT_STRIP_TRAILING_WHITESPACE
+  COMMAND_ERROR_IS_FATAL ANY)
 check_install(relative lib include)
 check_install(absolute ${WORK_DIR}/elsewhere/lib ${WORK_DIR}/elsewhere/headers)
+file(REMOVE_RECURSE ${WORK_DIR})

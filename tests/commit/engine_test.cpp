@@ -71,6 +71,43 @@ TEST(CommitEngineTest, PhasesComeInOrder)
     EXPECT_THAT(candidate.pending(bench.engine.running()), IsEmpty());
 }
 
+TEST(CommitEngineTest, ModulesStartInTheirOrderOnWhatIsInForce)
+{
+    std::vector<std::string> calls;
+    ScriptedModule first("first");
+    ScriptedModule second("second", {"/b/*"});
+    Bench bench({&first, &second});
+    first.calls = second.calls = &calls;
+    Config seen;
+    bool could_write = true;
+    second.on_start = [&](const mdb_db *running) {
+        seen = config_of(running->tree);
+        could_write = mdb_set_node_str(nullptr, const_cast<mdb_db *>(running), bsso_modify, 0,
+                                       bt_string, "2", "/a") == 0;
+    };
+    bench.start_with({{"/a", "1"}});
+    bench.engine.start_modules();
+    EXPECT_THAT(calls, ElementsAre("first start", "second start"));
+    EXPECT_EQ(seen, (Config{{"/a", "1"}}));
+    EXPECT_FALSE(could_write);
+    EXPECT_EQ(bench.running(), (Config{{"/a", "1"}}));
+}
+
+TEST(CommitEngineTest, AModuleThatCannotStartKeepsTheOthersFromIt)
+{
+    std::vector<std::string> calls;
+    ScriptedModule first("first");
+    ScriptedModule second("second");
+    Bench bench({&first, &second});
+    first.calls = second.calls = &calls;
+    first.on_start = [](const mdb_db *) { throw std::runtime_error("no memory"); };
+    EXPECT_THROW(bench.engine.start_modules(), std::runtime_error);
+    EXPECT_THAT(calls, ElementsAre("first start"));
+    first.on_start = nullptr;
+    bench.engine.start_modules();
+    EXPECT_THAT(calls, ElementsAre("first start", "first start", "second start"));
+}
+
 TEST(CommitEngineTest, ModuleWithoutAMatchingChangeIsNotCalled)
 {
     std::vector<std::string> calls;

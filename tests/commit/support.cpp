@@ -88,6 +88,14 @@ void ScriptedModule::note(const std::string &what)
     }
 }
 
+void ScriptedModule::start(const mdb_db *running)
+{
+    note("start");
+    if (on_start) {
+        on_start(running);
+    }
+}
+
 int ScriptedModule::check_change(md_dbinfo *info, mdb_db_change *change)
 {
     note("check " + described(change));

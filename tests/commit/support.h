@@ -48,11 +48,13 @@ class ScriptedModule : public ovhost::Module
 
     [[nodiscard]] std::string name() const override { return name_; }
     [[nodiscard]] std::vector<std::string> patterns() const override { return patterns_; }
+    void start(const mdb_db *running) override;
     int check_change(md_dbinfo *info, mdb_db_change *change) override;
     int check_commit(md_dbinfo *info, const mdb_db_change_array *changes) override;
     int apply(const md_dbinfo *info, const mdb_db_change_array *changes) override;
     void notify(const mdb_db_change_array *changes) override;
 
+    std::function<void(const mdb_db *)> on_start;
     std::function<int(md_dbinfo *, mdb_db_change *)> on_change;
     std::function<int(md_dbinfo *, const mdb_db_change_array *)> on_commit;
     std::function<int(const md_dbinfo *, const mdb_db_change_array *)> on_apply;

@@ -36,6 +36,8 @@ TEST(ArgumentsTest, GivesWhatIsThere)
     EXPECT_EQ(required_text(request, "name"), "/a");
     EXPECT_EQ(optional_text(request, "name", "other"), "/a");
     EXPECT_TRUE(optional_flag(request, "subtree"));
+    EXPECT_EQ(optional_number(request, "count"), 5U);
+    EXPECT_EQ(optional_number({{"n", 4294967295}}, "n"), 4294967295U);
 }
 
 TEST(ArgumentsTest, WhatIsOptionalMayBeLeftOutOrNull)
@@ -43,6 +45,8 @@ TEST(ArgumentsTest, WhatIsOptionalMayBeLeftOutOrNull)
     EXPECT_EQ(optional_text(request, "comment"), "");
     EXPECT_EQ(optional_text(request, "from", "running"), "running");
     EXPECT_FALSE(optional_flag(request, "from"));
+    EXPECT_EQ(optional_number(request, "from"), std::nullopt);
+    EXPECT_EQ(optional_number(request, "number"), std::nullopt);
     EXPECT_TRUE(optional_flag(request, "all", true));
 }
 
@@ -56,6 +60,12 @@ TEST(ArgumentsTest, FaultsNameCommandAndArgument)
               "command \"get\": \"count\" must be a string");
     EXPECT_EQ(fault_of([] { static_cast<void>(optional_flag(request, "count")); }),
               "command \"get\": \"count\" must be true or false");
+    for (const json &wrong : {json("5"), json(-1), json(0.5), json(true), json(4294967296)}) {
+        EXPECT_EQ(fault_of([&wrong] {
+                      static_cast<void>(optional_number({{"count", wrong}}, "count"));
+                  }),
+                  "command \"\": \"count\" must be a whole number from 0 to 4294967295");
+    }
 }
 
 } // namespace

@@ -326,6 +326,114 @@ TEST_F(OvctlTest, ShowModePrintsTheAnswers)
     EXPECT_EQ(request(), (json{{"command", "show"}, {"what", "mode"}}));
 }
 
+json tunnel_json(const char *name, json id, const char *alias, bool ambiguous)
+{
+    return {{"name", name},          {"id", std::move(id)},
+            {"alias", alias},        {"alias_is_ambiguous", ambiguous},
+            {"remote", "192.0.2.1"}, {"bandwidth", nullptr}};
+}
+
+TEST_F(OvctlTest, ShowTunnelsPrintsAList)
+{
+    answer_with({{"tunnels", json::array()}});
+    EXPECT_EQ(ask({"show", "tunnels"}), (Outcome{0, "no tunnels\n", ""}));
+    EXPECT_EQ(request(), (json{{"command", "show"}, {"what", "tunnels"}}));
+    answer_with(
+        {{"tunnels",
+          {tunnel_json("caf\xc3\xa9\n", 7, "hq", true),
+           tunnel_json("longname", 10021, "x y", false), tunnel_json("o", nullptr, "o", false)}}});
+    EXPECT_EQ(ask({"show", "tunnels"}), (Outcome{0,
+                                                 "NAME         ID  ALIAS\n"
+                                                 "caf\xc3\xa9\\n        7  hq (ambiguous)\n"
+                                                 "longname  10021  x y\n"
+                                                 "o          none  o\n",
+                                                 ""}));
+}
+
+TEST_F(OvctlTest, ShowTunnelPrintsATunnel)
+{
+    answer_with({{"by", "name"},
+                 {"value", "paris"},
+                 {"ambiguous", false},
+                 {"tunnels", {tunnel_json("paris", 3, "hq", true)}}});
+    const Outcome paris{0,
+                        "name                paris\n"
+                        "id                  3\n"
+                        "alias               hq (ambiguous)\n"
+                        "remote              192.0.2.1\n"
+                        "bandwidth           not set\n",
+                        ""};
+    EXPECT_EQ(ask({"show", "tunnel", "--name", "paris"}), paris);
+    EXPECT_EQ(request(), (json{{"command", "show"}, {"what", "tunnel"}, {"name", "paris"}}));
+    EXPECT_EQ(ask({"show", "tunnel", "--alias", ""}), paris);
+    EXPECT_EQ(request(), (json{{"command", "show"}, {"what", "tunnel"}, {"alias", ""}}));
+    EXPECT_EQ(ask({"show", "tunnel", "--id", "70000"}), paris);
+    EXPECT_EQ(request(), (json{{"command", "show"}, {"what", "tunnel"}, {"tunnel_id", 70000}}));
+}
+
+TEST_F(OvctlTest, ShowTunnelPrintsWhoClaimsAnAmbiguousAlias)
+{
+    answer_with(
+        {{"by", "alias"},
+         {"value", "hq"},
+         {"ambiguous", true},
+         {"tunnels", {tunnel_json("oslo", 0, "hq", true), tunnel_json("paris", 12, "hq", true)}}});
+    EXPECT_EQ(ask({"show", "tunnel", "--alias", "hq"}),
+              (Outcome{0,
+                       "the alias \"hq\" is ambiguous: 2 tunnels claim it\n"
+                       "NAME      ID  ALIAS\n"
+                       "oslo       0  hq (ambiguous)\n"
+                       "paris     12  hq (ambiguous)\n",
+                       ""}));
+}
+
+TEST_F(OvctlTest, ShowTunnelNeedsOneThingToFindItBy)
+{
+    const Outcome refusal{2, "", "ovctl: give one of --name, --alias and --id\n"};
+    EXPECT_EQ(ask({"show", "tunnel"}), refusal);
+    EXPECT_EQ(ask({"show", "tunnel", "--name", "a", "--id", "1"}), refusal);
+    for (const char *id : {"", "-1", "x", "4294967296", "1.5"})
+        EXPECT_EQ(ask({"show", "tunnel", "--id", id}),
+                  (Outcome{2, "", "ovctl: the ID must be a whole number from 0 to 4294967295\n"}))
+            << id;
+    EXPECT_TRUE(request().empty());
+}
+
+TEST_F(OvctlTest, ShowTunnelTablesPrintsBothTablesAndTheIds)
+{
+    const auto table = [](int occupied, int marks, int holes, int probe) {
+        return json{{"slots", 65536},
+                    {"occupied", occupied},
+                    {"collision_marks", marks},
+                    {"holes", holes},
+                    {"longest_probe", probe}};
+    };
+    json answer{{"names", table(10000, 0, 3, 120)},
+                {"aliases", table(5, 2, 0, 1)},
+                {"ids",
+                 {{"allowed", 1024},
+                  {"in_use", 7},
+                  {"reserve", 20},
+                  {"held_back", {{{"id", 3}, {"seconds", 1}}, {{"id", 9}, {"seconds", 42}}}}}}};
+    const std::string tables = "table               names   aliases\n"
+                               "slots               65536   65536\n"
+                               "occupied            10000   5\n"
+                               "collision marks     0       2\n"
+                               "holes               3       0\n"
+                               "longest probe       120     1\n"
+                               "IDs allowed         1024\n"
+                               "IDs in use          7\n"
+                               "IDs in reserve      20\n";
+    answer_with(answer);
+    EXPECT_EQ(
+        ask({"show", "tunnel-tables"}),
+        (Outcome{0, tables + "IDs held back       2, the first (ID 3) for 1 second more\n", ""}));
+    EXPECT_EQ(request(), (json{{"command", "show"}, {"what", "tunnel-tables"}}));
+    answer["ids"]["held_back"] = json::array();
+    answer_with(answer);
+    EXPECT_EQ(ask({"show", "tunnel-tables"}), (Outcome{0, tables + "IDs held back       0\n", ""}));
+}
+
 TEST_F(OvctlTest, ARefusedCommitNamesEveryNodeAndModule)
 {
     refuse_with({"refused",

@@ -47,6 +47,21 @@ TEST(TextInputTest, FormsThatStandForNothingAreRefused)
         EXPECT_NE(fault_of(text), "none") << text;
 }
 
+TEST(TextInputTest, ANumberIsWholeAndFits)
+{
+    EXPECT_EQ(checked_number("0", "N"), 0U);
+    EXPECT_EQ(checked_number("007", "N"), 7U);
+    EXPECT_EQ(checked_number("4294967295", "N"), 4294967295U);
+    for (const char *text : {"", "-1", "+1", " 1", "1 ", "1.5", "0x10", "4294967296", "one"}) {
+        try {
+            static_cast<void>(checked_number(text, "N"));
+            ADD_FAILURE() << text;
+        } catch (const UsageError &error) {
+            EXPECT_STREQ(error.what(), "N must be a whole number from 0 to 4294967295");
+        }
+    }
+}
+
 TEST(TextInputTest, AFileIsReadWhole)
 {
     const test::TempDir dir;

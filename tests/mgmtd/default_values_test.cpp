@@ -358,6 +358,25 @@ TEST_F(FirstStart, StoresNothingWhenTheModelFileHasAFault)
     EXPECT_EQ(value_in(again.running(), "/x/preserved"), "string p");
 }
 
+TEST_F(FirstStart, StoresNothingWhenAModuleRefuses)
+{
+    // Each line is fit for its node; together they are not.
+    write_file(preserved_file, "/ov/model/limits/max_tunnels,uint32,1\n"
+                               "/ov/tunneld/tunnel/config/a,string,a\n"
+                               "/ov/tunneld/tunnel/config/b,string,b\n");
+    Configuration configuration(state_.path());
+    std::string message;
+    try {
+        configuration.start();
+    } catch (const std::runtime_error &error) {
+        message = error.what();
+    }
+    EXPECT_EQ(message, "the first configuration is refused\n  no IDs for 2 new tunnels: 1 can be "
+                       "given now, and no more are free (tunnels)");
+    EXPECT_EQ(configuration.commit_number(), 0U);
+    EXPECT_TRUE(read_file(preserved_file));
+}
+
 TEST_F(FirstStart, KeepsPreservedValuesOfWhichSomeWereLeftOut)
 {
     const std::string text = "/x/good,string,1\n/ov/tunneld/system/config/mode,string,brigde\n";

@@ -1,0 +1,40 @@
+#include "host/ovctl/render_parts.h"
+
+#include "host/support/printable.h"
+
+#include <nlohmann/json.hpp>
+
+#include <iomanip>
+#include <ostream>
+
+namespace ovhost
+{
+
+using nlohmann::json;
+
+std::string text_of(const json &object, const char *member)
+{
+    return printable(object.at(member).get_ref<const std::string &>());
+}
+
+long count_of(const json &object, const char *member)
+{
+    return object.at(member).get<long>();
+}
+
+std::string counted(long count, const char *one, const char *many)
+{
+    return std::to_string(count) + " " + (count == 1 ? one : many);
+}
+
+void print_fact(std::ostream &out, const char *name, const std::string &value)
+{
+    out << std::left << std::setw(20) << name << value << '\n';
+}
+
+std::string text_or(const json &object, const char *member, const char *otherwise)
+{
+    return object.at(member).is_null() ? otherwise : text_of(object, member);
+}
+
+} // namespace ovhost

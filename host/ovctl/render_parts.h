@@ -1,0 +1,27 @@
+#pragma once
+// What the renderers (render.h, render_tunnels.h) have in common: members of a result as text for
+// people. A member that is missing or of another type throws nlohmann::json::exception.
+
+#include <nlohmann/json_fwd.hpp>
+
+#include <iosfwd>
+#include <string>
+
+namespace ovhost
+{
+
+[[nodiscard]] std::string text_of(const nlohmann::json &object, const char *member);
+
+/// A text, or what stands for null.
+[[nodiscard]] std::string text_or(const nlohmann::json &object, const char *member,
+                                  const char *otherwise);
+
+[[nodiscard]] long count_of(const nlohmann::json &object, const char *member);
+
+/// "1 change", "2 changes".
+[[nodiscard]] std::string counted(long count, const char *one, const char *many);
+
+/// Names and values in two columns.
+void print_fact(std::ostream &out, const char *name, const std::string &value);
+
+} // namespace ovhost
