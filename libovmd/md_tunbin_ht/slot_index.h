@@ -52,12 +52,12 @@ class slot_index
         if (slot == no_slot) {
             return false;
         }
-        add_to_path(table, home, slot, 1);
         table[slot].key = key;
         table[slot].value = value;
+        table[slot].count += 1;
         occupied_[slot] = true;
         if (slot != home) {
-            enter(key, slot);
+            enter(table, key, slot);
         }
         return true;
     }
@@ -65,13 +65,12 @@ class slot_index
     // Empties the slot where find() has found the key.
     void remove(okv_assoc_entry *table, okv_key key, uint32 slot)
     {
-        const uint32 home = okv_home(key);
-        if (slot != home) {
-            leave(table, key);
+        if (slot != okv_home(key)) {
+            leave(table, key, slot);
         }
         table[slot].value = OKV_INVALID_VALUE;
+        table[slot].count -= 1;
         occupied_[slot] = false;
-        add_to_path(table, home, slot, static_cast<uint32>(-1));
     }
 
   private:
@@ -103,10 +102,11 @@ class slot_index
         return no_bucket;
     }
 
-    // There is always room: a key in the table has one bucket at most. Spread keys seldom need
-    // this or leave(), which therefore stay out of their callers.
-    [[gnu::noinline]] void enter(okv_key key, uint32 slot)
+    // What a key takes that is not at home: a bucket, for which there is always room, and the
+    // counts on the way to it. Out of line, as leave() is: spread keys seldom come here.
+    [[gnu::noinline]] void enter(okv_assoc_entry *table, okv_key key, uint32 slot)
     {
+        add_to_way(table, okv_home(key), slot, 1);
         uint32 bucket = first_bucket(key);
         while (buckets_[bucket] != 0) {
             bucket = next_bucket(bucket);
@@ -114,10 +114,11 @@ class slot_index
         buckets_[bucket] = slot + 1;
     }
 
-    // Empties a key's bucket and moves up those behind it that would no longer be found past the
-    // gap.
-    [[gnu::noinline]] void leave(const okv_assoc_entry *table, okv_key key)
+    // Gives both back. The buckets behind the key's that would no longer be found past the gap move
+    // up.
+    [[gnu::noinline]] void leave(okv_assoc_entry *table, okv_key key, uint32 slot)
     {
+        add_to_way(table, okv_home(key), slot, static_cast<uint32>(-1));
         uint32 gap = find_bucket(table, key);
         buckets_[gap] = 0;
         for (uint32 bucket = next_bucket(gap); buckets_[bucket] != 0;
@@ -145,14 +146,14 @@ class slot_index
                                 : no_slot;
     }
 
-    // Adds to the counts from a key's home to its slot, both included.
-    static void add_to_path(okv_assoc_entry *table, uint32 home, uint32 slot, uint32 amount)
+    // Adds to the counts from a key's home up to but not including its slot.
+    static void add_to_way(okv_assoc_entry *table, uint32 home, uint32 slot, uint32 amount)
     {
         if (slot < home) {
             add_to_range(table + home, table + OKV_ASSOC_SIZE, amount);
             home = 0;
         }
-        add_to_range(table + home, table + slot + 1, amount);
+        add_to_range(table + home, table + slot, amount);
     }
 
     static void add_to_range(okv_assoc_entry *first, const okv_assoc_entry *end, uint32 amount)
