@@ -123,7 +123,8 @@ void Configuration::start()
     }
     // The file may have been lost while the daemon was away; the library logs why it fails.
     if (write_dyna_limits_conf(running_db()) != 0) {
-        log_line(ov_log_warning, "the limits file could not be written: is /var/opt/tms there?");
+        log_line(ov_log_warning, "/var/opt/tms/dynalimits.conf could not be written: look at that "
+                                 "folder, its rights and its free space");
     }
 }
 
