@@ -23,6 +23,13 @@ class MedianKeeper : public benchmark::ConsoleReporter
   public:
     MedianKeeper() : ConsoleReporter(::isatty(STDOUT_FILENO) != 0 ? OO_ColorTabular : OO_Tabular) {}
 
+    // The machine is told once, not for each group.
+    bool ReportContext(const Context &context) override
+    {
+        const bool first = medians_.empty();
+        return first ? ConsoleReporter::ReportContext(context) : true;
+    }
+
     void ReportRuns(const std::vector<Run> &runs) override
     {
         for (const Run &run : runs) {
@@ -145,7 +152,7 @@ Score print_report(const MedianKeeper &medians, const GoalReport &report)
 
 int run_with_goals(int argc, char **argv, const GoalReport &report)
 {
-    // Whatever else the machine does for a while then falls on a bench and its peers alike.
+    // Whatever else the machine does for a while falls on a bench and its peers alike.
     std::string interleaving = "--benchmark_enable_random_interleaving=true";
     std::vector<char *> arguments = {argv[0], interleaving.data()};
     arguments.insert(arguments.end(), argv + 1, argv + argc);
@@ -156,7 +163,14 @@ int run_with_goals(int argc, char **argv, const GoalReport &report)
         return 2;
     }
     MedianKeeper medians;
-    benchmark::RunSpecifiedBenchmarks(&medians);
+    const std::string selected = benchmark::GetBenchmarkFilter();
+    if (!selected.empty() || report.groups.empty()) {
+        benchmark::RunSpecifiedBenchmarks(&medians);
+    } else {
+        for (const std::string &group : report.groups) {
+            benchmark::RunSpecifiedBenchmarks(&medians, group);
+        }
+    }
     const Score score = print_report(medians, report);
     benchmark::Shutdown();
     return score.reached == score.goals ? 0 : 1;

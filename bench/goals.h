@@ -36,11 +36,13 @@ struct GoalTable {
 struct GoalReport {
     std::string title;
     std::vector<GoalTable> tables;
+    /// Patterns of the benches that run together: a bench and its peers. None: all together.
+    std::vector<std::string> groups = {};
 };
 
-/// Runs the benches that the command line selects, the repetitions of all of them in random order,
-/// and prints the report from the medians. Answers the process's exit status: 1 when a goal was
-/// missed.
+/// Runs the benches that the command line selects, or else the groups one by one, the repetitions
+/// of a group in random order, and prints the report from the medians. Answers the process's exit
+/// status: 1 when a goal was missed.
 int run_with_goals(int argc, char **argv, const GoalReport &report);
 
 } // namespace ovbench

@@ -170,7 +170,9 @@ int main(int argc, char **argv)
         "library",
         {"scan"},
         {}};
+    std::vector<std::string> groups;
     for (const NameShape &shape : name_shapes) {
+        groups.push_back(std::string("/") + shape.name + "/");
         for (const bool known : {true, false}) {
             add_bench<LibrarySearch>(shape, known);
             add_bench<ScanningSearch>(shape, known);
@@ -179,5 +181,5 @@ int main(int argc, char **argv)
                                   {{bench_name(known, ScanningSearch::name, shape), limit}}});
         }
     }
-    return run_with_goals(argc, argv, {"Tunnel ID by name", {table}});
+    return run_with_goals(argc, argv, {"Tunnel ID by name", {table}, groups});
 }

@@ -178,6 +178,18 @@ void add_benches()
     }
 }
 
+/// A size of a shape: all tables and operations.
+std::vector<std::string> groups()
+{
+    std::vector<std::string> patterns;
+    for (const NameShape &shape : name_shapes) {
+        for (const std::size_t size : sizes) {
+            patterns.push_back(bench_name("", "", shape, size).substr(1) + "/");
+        }
+    }
+    return patterns;
+}
+
 std::string row_label(const NameShape &shape, std::size_t size)
 {
     return std::string(shape.label) + ": " + std::to_string(size);
@@ -302,5 +314,6 @@ int main(int argc, char **argv)
                      "0.8 times `std`."),
           find_table(find_miss_goal,
                      "An unknown name: at most 3.5 times `absl` and 0.75 times `std`."),
-          growth_table(), shared_homes_table(), spread_table()}});
+          growth_table(), shared_homes_table(), spread_table()},
+         groups()});
 }
