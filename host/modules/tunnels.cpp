@@ -112,7 +112,8 @@ void remember(const mdb_db *newdb, const std::set<std::string> &aliases,
     };
     for (const std::string &name : child_names(newdb, tunnels_node)) {
         const std::optional<Tunnel> tunnel = read_tunnel(newdb, name);
-        if (tunnel && aliases.contains(tunnel->alias.value_or(name)) && !is_changed(name)) {
+        if (tunnel && aliases.contains(tunnel->alias.value_or(name)) && !is_changed(name) &&
+            is_taken_up(*tunnel)) {
             outcome.add(cache(*tunnel), "remember", *tunnel);
         }
     }

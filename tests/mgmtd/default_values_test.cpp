@@ -361,9 +361,10 @@ TEST_F(FirstStart, StoresNothingWhenTheModelFileHasAFault)
 TEST_F(FirstStart, StoresNothingWhenAModuleRefuses)
 {
     // Each line is fit for its node; together they are not.
-    write_file(preserved_file, "/ov/model/limits/max_tunnels,uint32,1\n"
-                               "/ov/tunneld/tunnel/config/a,string,a\n"
-                               "/ov/tunneld/tunnel/config/b,string,b\n");
+    write_file(preserved_file, "/ov/tunneld/tunnel/config/a,string,a\n"
+                               "/ov/tunneld/tunnel/config/a/id,uint16,7\n"
+                               "/ov/tunneld/tunnel/config/b,string,b\n"
+                               "/ov/tunneld/tunnel/config/b/id,uint16,7\n");
     Configuration configuration(state_.path());
     std::string message;
     try {
@@ -371,8 +372,8 @@ TEST_F(FirstStart, StoresNothingWhenAModuleRefuses)
     } catch (const std::runtime_error &error) {
         message = error.what();
     }
-    EXPECT_EQ(message, "the first configuration is refused\n  no IDs for 2 new tunnels: 1 can be "
-                       "given now, and no more are free (tunnels)");
+    EXPECT_EQ(message, "the first configuration is refused\n  tunnels \"a\" and \"b\" ask for one "
+                       "ID, 7 (tunnels)");
     EXPECT_EQ(configuration.commit_number(), 0U);
     EXPECT_TRUE(read_file(preserved_file));
 }

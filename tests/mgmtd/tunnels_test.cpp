@@ -504,6 +504,31 @@ TEST_F(Tunnels, ThatWereLeftOutStayOutUntilTheyCanHaveAnId)
     EXPECT_EQ(md_tunbin_ht_get_id_by_alias("y"), 0U);
 }
 
+TEST_F(Tunnels, ThatWereLeftOutStayOutWhenTheirAliasIsNoLongerAmbiguous)
+{
+    configuration_.reset();
+    std::vector<StoredChange> nodes;
+    const auto store = [&nodes](const std::string &name, const char *id) {
+        nodes.push_back({tunnel(name), StoredValue{bt_string, name}});
+        nodes.push_back({tunnel(name, "alias"), StoredValue{bt_string, "hq"}});
+        if (id != nullptr) {
+            nodes.push_back({tunnel(name, "id"), StoredValue{bt_uint16, id}});
+        }
+    };
+    store("a", "5");
+    store("b", "6");
+    store("c", "6");
+    store("d", nullptr);
+    Store::open(state_.path()).commit(nodes);
+    restart();
+    EXPECT_EQ(md_tunbin_ht_get_id_by_alias("hq"), none);
+    remove("a");
+    ASSERT_EQ(commit(), "committed");
+    EXPECT_EQ(md_tunbin_ht_get_id_by_alias("hq"), 6U) << "b alone";
+    EXPECT_STREQ(md_tunbin_ht_get_name_by_id(6), "b");
+    EXPECT_EQ(md_tunbin_ht_get_id_by_name("c"), none);
+}
+
 TEST_F(Tunnels, OfTheModelsDefaultsHaveIds)
 {
     configuration_.reset();
