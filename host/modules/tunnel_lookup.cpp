@@ -64,7 +64,8 @@ std::vector<TunnelFacts> list_tunnels(const mdb_db *db)
         int err = md_get_tunnel_name_str_sorted(position, &name);
         uint32 id = TUNNEL_ID_NONE;
         if (err == 0) {
-            err = md_get_tunnel_id_sorted(make_tstring(name).get(), &id);
+            err = name != nullptr ? md_get_tunnel_id_sorted(make_tstring(name).get(), &id)
+                                  : lc_err_unexpected_null;
         }
         if (err != 0) {
             throw std::runtime_error("cannot list tunnel " + std::to_string(position) + " of " +

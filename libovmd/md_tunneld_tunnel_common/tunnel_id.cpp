@@ -26,6 +26,13 @@ uint32_array *tunnel_sorted_seq;
 unsigned char *name_marks;
 uint32 num_records;
 
+// A bound that a host raises later brings no IDs: there are records for those of the start alone.
+uint32 id_bound()
+{
+    const uint32 bound = get_max_tunnel_number();
+    return tunnel_ids != nullptr && num_records < bound ? num_records : bound;
+}
+
 unsigned char mark_of(const tstring *name)
 {
     uint32 hash = 2166136261u;
@@ -111,7 +118,7 @@ int tunnel_sorted_seq_compare(const void *id1, const void *id2)
     }
     const uint32 first = *static_cast<const uint32 *>(id1);
     const uint32 second = *static_cast<const uint32 *>(id2);
-    const uint32 bound = get_max_tunnel_number();
+    const uint32 bound = id_bound();
     if (first == second || (first >= bound && second >= bound)) {
         return 0;
     }
@@ -167,7 +174,7 @@ int md_set_tunnel_id(uint32 id, const tstring *tun_name)
         return 0;
     }
     BAIL_NULL(tunnel_ids);
-    BAIL_REQUIRE(id < get_max_tunnel_number());
+    BAIL_REQUIRE(id < id_bound());
 
     tunnel_id_info &record = tunnel_ids[id];
     if (record.name != nullptr) {
@@ -195,7 +202,7 @@ int md_free_tunnel_id(const tstring *tun_name)
                ts_str(tun_name));
         return found;
     }
-    if (id >= get_max_tunnel_number()) {
+    if (id >= id_bound()) {
         return 0;
     }
     tunnel_id_info &record = tunnel_ids[id];
@@ -218,7 +225,7 @@ int md_get_tunnel_id(const tstring *tun_name, uint32 *id)
     BAIL_NULL(tunnel_ids);
 
     const unsigned char mark = mark_of(tun_name);
-    const uint32 bound = get_max_tunnel_number();
+    const uint32 bound = id_bound();
     for (uint32 candidate = next_marked(mark, 0, bound); candidate < bound;
          candidate = next_marked(mark, candidate + 1, bound)) {
         if (tunnel_ids[candidate].name != nullptr &&
@@ -245,7 +252,7 @@ int md_get_tunnel_id_sorted(tstring *tunname, uint32 *ret_tun_id)
     uint32 position = start_idx;
     for (uint32 n = 0; n < total; ++n) {
         const uint32 id = uint32_array_get_quick(tunnel_sorted_seq, position);
-        BAIL_REQUIRE(id < get_max_tunnel_number());
+        BAIL_REQUIRE(id < id_bound());
         if (ts_cmp(tunnel_ids[id].name, tunname) == 0) {
             *ret_tun_id = id;
             start_idx = position;
@@ -267,7 +274,7 @@ int md_get_tunnel_name_str_sorted(uint32 idx, const char **tun_name)
         return lc_err_not_found;
     }
     const uint32 id = uint32_array_get_quick(tunnel_sorted_seq, idx);
-    if (id >= get_max_tunnel_number()) {
+    if (id >= id_bound()) {
         return lc_err_not_found;
     }
     BAIL_NULL(tunnel_ids);

@@ -573,6 +573,18 @@ TEST_F(TunnelIdsUnderALowerBound, AnIdPastItIsNotFreed)
     EXPECT_EQ(id_of("alpha"), "0 50");
 }
 
+TEST_F(TunnelIds, GainNoIdsFromABoundThatRises)
+{
+    planted().tunnel_bounds = {bound + 100};
+    EXPECT_EQ(id_of("alpha"), "14004 77");
+    EXPECT_EQ(set_id(bound, "alpha"), lc_err_assertion_failed);
+    EXPECT_EQ(set_id(bound - 1, "alpha"), 0);
+    EXPECT_EQ(id_of("alpha"), "0 99");
+    const uint32 past = bound;
+    const uint32 last = bound - 1;
+    EXPECT_EQ(tunnel_sorted_seq_compare(&past, &last), -1);
+}
+
 class TunnelIdsWithoutSequence : public TunnelIds
 {
   protected:
