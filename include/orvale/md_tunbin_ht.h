@@ -32,8 +32,8 @@ OV_API int md_tunbin_ht_init(void);
  * An ID in use is overwritten, and its old name and alias keep leading to it: delete a tunnel
  * before it is added under another name.
  *
- * vtunbin  a tunnel_config_bin_t, of which the three fields of tunnel_defs.h are read, a text
- *          without its NUL but for the last character; null: nothing is done
+ * vtunbin  a tunnel_config_bin_t, of which the three fields of tunnel_defs.h are read; a text that
+ *          fills its field without a NUL is read without its last character; null: nothing is done
  * Returns 0; 14000 for an ID above 10021.
  */
 OV_NODISCARD OV_API int md_tunbin_ht_add(const void *vtunbin);
@@ -72,18 +72,20 @@ OV_API int tunbin_tunname_ht_init(void);
 OV_API int tunbin_tunalias_ht_init(void);
 
 /*
- * Records that a text leads to an ID. One that leads to another ID already is marked ambiguous, and
- * stays so until it is deleted. An ID of 65535 records nothing for a text that is not there.
+ * Records that a text, which is not null, leads to an ID. One that leads to another ID already is
+ * marked ambiguous, and stays so until it is deleted. An ID of 65535 records nothing for a text that
+ * is not there, and a full table takes no further text: it stays unknown, which is logged.
  */
 OV_API void tunbin_tunname_ht_add(char *name, uint32 id);
 OV_API void tunbin_tunalias_ht_add(char *alias, uint32 id);
 
-/* Forgets a text, ambiguous or not. */
+/* Forgets a text, ambiguous or not; it is not null. */
 OV_API void tunbin_tunname_ht_del(char *name);
 OV_API void tunbin_tunalias_ht_del(char *alias);
 
 /*
- * The ID that a text leads to. `tid` may be null; it is left alone when the text leads nowhere.
+ * The ID that a text, which is not null, leads to. `tid` may be null; it is left alone when the text
+ * leads nowhere.
  * Returns 0; 14004 when the text is unknown or ambiguous.
  */
 OV_NODISCARD OV_API int tunbin_tunname_ht_find(const char *name, uint32 *tid);

@@ -130,7 +130,7 @@ static inline uint64 hash64_word(const char *text, int32 length, int32 from)
  * The key of a text.
  *
  * text   read to its NUL; must be shorter than 2 GiB
- * seed   the table's own; keys of different seeds have nothing to do with one another
+ * seed   the table's own; the same text has another key under another seed
  * state  receives what the hashing leaves behind
  */
 static inline okv_key hash64_key(const char *text, uint64 seed, hash64_state *state)

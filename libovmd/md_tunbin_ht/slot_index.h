@@ -2,8 +2,9 @@
 //
 // Names of under 24 bytes share at most 256 home slots, so that a walk from a key's home passes
 // thousands of others. What the table holds is fixed to the count; where a key stands that is not
-// at home is told here in constant time, and where the next empty slot is, by a search over one
-// byte for each slot. The table belongs to one owner, who makes every change through an index.
+// at home is told here, in constant time on average, and where the next empty slot is, by a search
+// over one byte for each slot. The table belongs to one owner, who makes every change through an
+// index.
 #pragma once
 
 #include "orvale/ov_kvassoc.h"
