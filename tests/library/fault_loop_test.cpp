@@ -39,6 +39,8 @@ std::string bail_text(int code)
     switch (code) {
     case 14001:
         return "Error code 14001 (unexpected NULL) returned";
+    case 14002:
+        return "Error code 14002 (assertion failed) returned";
     case code_of_table:
         return "Error code 14004 (item not found) returned";
     default:
@@ -59,6 +61,8 @@ struct ExpectedTrace {
         const std::string text = with_code(line.text, code);
         if (line.kind == Kind::gated) {
             lines.push_back(gated_line(line.level, text));
+        } else if (line.kind == Kind::debug) {
+            lines.push_back(debug_line(line.unit, line.function, text));
         } else if (line.kind == Kind::unexpected) {
             lines.push_back(error_line(line.unit, line.function, "Unexpected NULL"));
             ++exits;

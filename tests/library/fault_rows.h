@@ -16,13 +16,15 @@
 namespace ovtest
 {
 
-// A line that is expected in the log. Only gated lines are written for a cancelled operation.
+// A line that is expected in the log. For a cancelled operation only gated lines and traces are
+// written.
 struct ExpectedLine {
     enum class Kind {
         bail,       // the code by the bail rule
         bail_text,  // a text of its own in place of the code's, by the bail rule
         unexpected, // "Unexpected NULL"
         error,      // an error line that is not itself an error exit
+        debug,      // a trace
         gated,      // ov_log_internal
     };
     Kind kind;
@@ -54,6 +56,10 @@ class UnitLines
     ExpectedLine error(const std::string &function, const std::string &text) const
     {
         return {ExpectedLine::Kind::error, unit_, function, text};
+    }
+    ExpectedLine debug(const std::string &function, const std::string &text) const
+    {
+        return {ExpectedLine::Kind::debug, unit_, function, text};
     }
 
   private:

@@ -9,6 +9,7 @@
 
 #include "tests/support/host_operations.h"
 
+#include <map>
 #include <optional>
 #include <string>
 #include <type_traits>
@@ -52,6 +53,11 @@ struct PlantedAnswers {
     std::optional<uint64> ms_since_boot;
     // ctime_init does nothing.
     bool without_time_info = false;
+    // Of get_max_rmap_entries and its like.
+    std::map<Operation, uint32> max_entries;
+    // The library's so many-th call of tstr_array_get_str_quick, counted from 1, answers null; 0 is
+    // none of them.
+    unsigned null_text_at_call = 0;
 };
 PlantedAnswers &planted();
 
@@ -74,6 +80,10 @@ std::vector<std::string> log_lines();
 
 // A line of lc_log_internal at level 3 as the library has to write it.
 std::string error_line(const std::string &unit, const std::string &function,
+                       const std::string &text);
+
+// A trace: a line of lc_log_internal at level 7.
+std::string debug_line(const std::string &unit, const std::string &function,
                        const std::string &text);
 
 // A line of ov_log_internal; the function is null, or the text of it for the module gate.

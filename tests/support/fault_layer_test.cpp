@@ -201,6 +201,28 @@ TEST_F(FaultLayer, PlantsAnswers)
     EXPECT_NE(time_info_ptr, nullptr);
 }
 
+TEST_F(FaultLayer, PlantsTheModelsNumbersOfEntries)
+{
+    planted().max_entries = {{Operation::get_max_rmap_entries, 3},
+                             {Operation::get_max_dns_proxy_map_entries, 0}};
+    EXPECT_EQ(in_library(get_max_rmap_entries), 3U);
+    EXPECT_EQ(in_library(get_max_dns_proxy_map_entries), 0U);
+    EXPECT_GT(in_library(get_max_omap_entries), 3U);
+}
+
+TEST_F(FaultLayer, PlantsANullTextInAList)
+{
+    tstr_array *array = nullptr;
+    ASSERT_EQ(tstr_array_new(&array, nullptr), 0);
+    ASSERT_EQ(tstr_array_append_str(array, "text"), 0);
+    planted().null_text_at_call = 2;
+    EXPECT_STREQ(in_library(tstr_array_get_str_quick, array, 0U), "text");
+    EXPECT_STREQ(tstr_array_get_str_quick(array, 0), "text");
+    EXPECT_EQ(in_library(tstr_array_get_str_quick, array, 0U), nullptr);
+    EXPECT_STREQ(in_library(tstr_array_get_str_quick, array, 0U), "text");
+    tstr_array_free(&array);
+}
+
 TEST_F(FaultLayer, ForgetsCallsButNoObjects)
 {
     tstring *string = in_library(new_string, "text");
@@ -215,6 +237,19 @@ int log_two_lines(const char *text)
     (void)lc_log_internal("f", "unit", 12, 2048, 0, 3, "said %s", text);
     ov_log_internal(5, nullptr, 0, "also %s", text);
     return 0;
+}
+
+int log_a_trace()
+{
+    return lc_log_internal("f", "unit", 12, 2048, 0, 7, "smprintf=%s", "/ov");
+}
+
+TEST_F(FaultLayer, RecordsTraces)
+{
+    (void)in_library(log_a_trace);
+    EXPECT_THAT(log_lines(),
+                ElementsAre("lc_log_internal(\"f\", \"unit\", LINE, 2048, 0, 7): smprintf=/ov"));
+    EXPECT_THAT(log_lines(), ElementsAre(debug_line("unit", "f", "smprintf=/ov")));
 }
 
 TEST_F(FaultLayer, RecordsLogLines)

@@ -207,6 +207,12 @@ std::string error_line(const std::string &unit, const std::string &function,
     return unit_log_line(function.c_str(), unit.c_str(), 1, 2048, 0, 3, text.c_str());
 }
 
+std::string debug_line(const std::string &unit, const std::string &function,
+                       const std::string &text)
+{
+    return unit_log_line(function.c_str(), unit.c_str(), 1, 2048, 0, 7, text.c_str());
+}
+
 std::string gated_line(int level, const std::string &text)
 {
     return ov_log_line(level, nullptr, 0, text.c_str());
