@@ -66,22 +66,25 @@ static inline int bail_report_condition(const char *function, const char *unit, 
 /* Reports a failing status of the calling function without leaving it. */
 #define BAIL_REPORT(err) bail_report_error((err), __func__, bail_unit, __LINE__)
 
-/* Leaves with the status when it is not 0. */
-#define BAIL_ERROR(err)                                                                            \
+/* Leaves with the status when it is not 0. With _FOR, one step of a longer function reports in that
+ * function's name, and whoever calls it passes the status on without another line. */
+#define BAIL_ERROR_FOR(function, err)                                                              \
     do {                                                                                           \
         const int bail_code_ = (err);                                                              \
         if (bail_code_ != 0) {                                                                     \
-            return bail_report_error(bail_code_, __func__, bail_unit, __LINE__);                   \
+            return bail_report_error(bail_code_, (function), bail_unit, __LINE__);                 \
         }                                                                                          \
     } while (0)
+#define BAIL_ERROR(err) BAIL_ERROR_FOR(__func__, err)
 
 /* Leaves with 14001 when the pointer is null. */
-#define BAIL_NULL(pointer)                                                                         \
+#define BAIL_NULL_FOR(function, pointer)                                                           \
     do {                                                                                           \
         if ((pointer) == NULL) {                                                                   \
-            return bail_report_null(__func__, bail_unit, __LINE__);                                \
+            return bail_report_null((function), bail_unit, __LINE__);                              \
         }                                                                                          \
     } while (0)
+#define BAIL_NULL(pointer) BAIL_NULL_FOR(__func__, pointer)
 
 /* Leaves with 14002 when the condition does not hold. */
 #define BAIL_REQUIRE(condition)                                                                    \

@@ -73,8 +73,8 @@ OV_API int tunbin_tunalias_ht_init(void);
 
 /*
  * Records that a text, which is not null, leads to an ID. One that leads to another ID already is
- * marked ambiguous, and stays so until it is deleted. An ID of 65535 records nothing for a text that
- * is not there, and a full table takes no further text: it stays unknown, which is logged.
+ * marked ambiguous, and stays so until it is deleted. An ID of 65535 records nothing for a text
+ * that is not there, and a full table takes no further text: it stays unknown, which is logged.
  */
 OV_API void tunbin_tunname_ht_add(char *name, uint32 id);
 OV_API void tunbin_tunalias_ht_add(char *alias, uint32 id);
@@ -84,8 +84,8 @@ OV_API void tunbin_tunname_ht_del(char *name);
 OV_API void tunbin_tunalias_ht_del(char *alias);
 
 /*
- * The ID that a text, which is not null, leads to. `tid` may be null; it is left alone when the text
- * leads nowhere.
+ * The ID that a text, which is not null, leads to. `tid` may be null; it is left alone when the
+ * text leads nowhere.
  * Returns 0; 14004 when the text is unknown or ambiguous.
  */
 OV_NODISCARD OV_API int tunbin_tunname_ht_find(const char *name, uint32 *tid);

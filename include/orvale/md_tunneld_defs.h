@@ -9,7 +9,7 @@
 
 OV_C_BEGIN
 
-/* How many IDs must stay unused for an offer to be made: a margin while the space is nearly full. */
+/* How many IDs must stay unused when some are offered: a margin while the space is nearly full. */
 #define TUNNEL_ID_RESERVE 20u
 
 /* How long a freed ID is held back, in milliseconds. */

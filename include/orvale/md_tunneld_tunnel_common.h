@@ -1,5 +1,6 @@
 /*
- * Questions about the system mode and the hardware options of the appliance, and the tunnel IDs.
+ * Questions about the system mode and the hardware options of the appliance, the tunnel IDs, and
+ * who uses an application.
  */
 #ifndef ORVALE_MD_TUNNELD_TUNNEL_COMMON_H
 #define ORVALE_MD_TUNNELD_TUNNEL_COMMON_H
@@ -62,7 +63,8 @@ OV_API tbool md_is_bonding_enabled(const mdb_db *db);
  * IDs run from 0 to get_max_tunnel_number() - 1, a bound that must not change for the life of the
  * process and must stay below 65536. An ID is in use while a tunnel's name is bound to it. Free IDs
  * are offered in the order in which they became free, never-used ones first in ascending order, and
- * a freed one only after 60 seconds. Names are compared byte for byte.
+ * a freed one only when more than 60 seconds have passed by the host's time since boot; one freed
+ * at time 0 counts as never used. Names are compared byte for byte.
  *
  * Order of calls: md_init_tunnel_id once; then for each commit md_get_next_n_available_tunnel_ids
  * for its new tunnels, md_set_tunnel_id for each, and md_free_tunnel_id for each removed one.
@@ -71,39 +73,45 @@ OV_API tbool md_is_bonding_enabled(const mdb_db *db);
 /*
  * Makes all IDs free and never used.
  * Returns 0; 14001 when there is no memory for the records. That the sequence of names could not be
- * made is logged only: there are then no IDs by name order, and binding an ID fails.
+ * made is no failure of this call, and is logged unless its code is 14120: there are then no IDs by
+ * name order, the number of IDs in use reads 0, and binding an ID fails.
  */
 OV_NODISCARD OV_API int md_init_tunnel_id(void);
 
 /*
  * Offers free IDs. Nothing is taken: asking again offers the same ones until md_set_tunnel_id takes
- * them. The last 20 IDs of the space are never offered.
+ * them. Refused when fewer than 20 IDs would stay unused; with a bound below 20 there is no such
+ * margin.
  *
  * num_tunnels  how many
  * tun_ids      receives the IDs at its end, and must be empty; null: nothing is offered
- * Returns 0 when exactly so many were offered, or when there was nothing to offer; 1 otherwise: not
- * enough spare IDs, the next one was freed 60000 ms ago or less, or tun_ids could not take them.
- * IDs appended before a failure stay there.
+ * Returns 0 when exactly so many were offered, and when none were asked for or tun_ids is null; 1
+ * otherwise: too few IDs are unused, the next one was freed 60000 ms ago or less, or tun_ids was
+ * not empty or could not take them. IDs appended before a failure stay there.
  */
 OV_NODISCARD OV_API int md_get_next_n_available_tunnel_ids(uint32 num_tunnels,
                                                            uint32_array *tun_ids);
 
 /*
  * Binds an ID to a tunnel's name, taking it from the free ones; an ID in use is bound to the new
- * name instead. The name "default" is not bound, and that is no error. Neither the 60 seconds nor a
- * second ID of the same name are checked.
+ * name instead. The name "default" is not bound, and that is no error, before md_init_tunnel_id
+ * either. Neither the 60 seconds nor a second ID of the same name are checked.
  *
  * tun_name  copied
  * Returns 0; 14001 when tun_name is null or before md_init_tunnel_id; 14002 for an ID past the
- * bound; the code of ts_dup or of the array of names. After such a code the ID may be without its
- * old name and not among the free ones.
+ * bound; the code of ts_dup or of the sequence of names. A code of these last leaves the work half
+ * done: the old name could not be taken out of the sequence, and the ID is without a name, not
+ * among the free ones, and still in the sequence; or the name could not be copied, and it is in
+ * neither; or it could not be put in the sequence, and the ID is bound but has no place in the
+ * order of names and is not counted.
  */
 OV_NODISCARD OV_API int md_set_tunnel_id(uint32 id, const tstring *tun_name);
 
 /*
  * Frees a tunnel's ID and holds it back for 60 seconds.
  * Returns 0; 14001 when tun_name is null or before md_init_tunnel_id; 14004 when no ID has the
- * name; the code of the array of names, which does not keep the ID from being freed.
+ * name; the code of the sequence of names, which does not keep the ID from being freed. That code
+ * may be 14004, too, when the ID had no place in the sequence.
  */
 OV_NODISCARD OV_API int md_free_tunnel_id(const tstring *tun_name);
 
@@ -116,8 +124,9 @@ OV_NODISCARD OV_API int md_free_tunnel_id(const tstring *tun_name);
 OV_NODISCARD OV_API int md_get_tunnel_id(const tstring *tun_name, uint32 *id);
 
 /*
- * The same for callers that walk the tunnels in the order of their names: the search goes on where
- * the last one ended.
+ * The ID of a name for callers that walk the tunnels in the order of their names: the search begins
+ * where the last one that found its name has found it, and goes around once. Where several IDs
+ * share a name, the first that is met counts.
  *
  * ret_tun_id  receives 65535 on failure
  * Returns 0; 14004 when there is none; 14001 when ret_tun_id is null or before md_init_tunnel_id;
@@ -128,13 +137,14 @@ OV_NODISCARD OV_API int md_get_tunnel_id_sorted(tstring *tunname, uint32 *ret_tu
 /*
  * The name at a position of the order of names, counted from 0.
  *
- * tun_name  receives the text, borrowed until its ID is bound anew or freed; left alone on failure
- * Returns 0; 14004 for a position past the end; 14001 when tun_name is null or before
- * md_init_tunnel_id.
+ * tun_name  receives the text, borrowed until its ID is bound anew or freed; null for an ID that an
+ *           earlier failure has left in the sequence without its name; left alone on failure
+ * Returns 0; 14004 for a position past the end, before md_init_tunnel_id for every one; 14001 when
+ * tun_name is null.
  */
 OV_NODISCARD OV_API int md_get_tunnel_name_str_sorted(uint32 idx, const char **tun_name);
 
-/* The number of IDs in use; 0 before md_init_tunnel_id. */
+/* The number of IDs in use, by the sequence of their names; 0 before md_init_tunnel_id. */
 OV_API int md_get_total_tunnels(void);
 
 /*
@@ -145,6 +155,64 @@ OV_API int md_get_total_tunnels(void);
  * Returns a negative number, 0 or a positive one.
  */
 OV_API int tunnel_sorted_seq_compare(const void *id1, const void *id2);
+
+/*
+ * Who uses an application. Names are compared byte for byte. Of maps, the entries' node
+ * "match/0/application" is looked at, not their match strings.
+ */
+
+/*
+ * Whether an entry of an ACL is about an application. A null name finds nothing.
+ *
+ * found   may be null; left alone on failure
+ * bnames  receives the full names of the nodes that name it at its end; null: the search ends at
+ * the first. Names appended before a failure stay there. Returns 0; 14001 when db is null; the code
+ * of a query or of bnames.
+ */
+OV_NODISCARD OV_API int md_find_app_name_in_acl(const char *appName, const mdb_db *db, tbool *found,
+                                                tstr_array *bnames);
+
+/*
+ * The same for the entries of the maps under a root.
+ *
+ * mapNamePrefix  the root, such as "/ov/tunneld/route_map/config/map"
+ */
+OV_NODISCARD OV_API int md_find_app_name_in_xxxmap(const char *appName, const mdb_db *db,
+                                                   const char *mapNamePrefix, tbool *found,
+                                                   tstr_array *bnames);
+
+/*
+ * Whether an ACL, a route map, an optimisation map or a QoS map uses an application; maps of other
+ * kinds are not searched.
+ *
+ * existsInString  may be null; receives a new text for the user that tells the first of these that
+ *                 does, which the caller releases with free(), or null when there is none
+ * bnames          may be null; receives a new array of the full names of all nodes that name it,
+ *                 which the caller releases with tstr_array_free
+ * Both receive null on failure.
+ * Returns 0; 14001 when db is null or memory has run out; the code of a query or array.
+ */
+OV_NODISCARD OV_API int md_find_appname_in_acl_or_xxxmap(const char *appName, const mdb_db *db,
+                                                         char **existsInString,
+                                                         tstr_array **bnames);
+
+/*
+ * The number of application rules, "/ov/tunneld/app/config/RULE/name", that carry a name.
+ *
+ * num_rules  receives the number, 0 on failure; left alone when an argument is null
+ * Returns 0; 14001 when an argument is null or a rule has no name; the code of a query.
+ */
+OV_NODISCARD OV_API int md_get_app_num_rules(const mdb_db *db, const char *app_name,
+                                             int *num_rules);
+
+/*
+ * The names that application rules carry, each once, at the place of its last rule.
+ *
+ * names  receives a new array, which the caller releases with tstr_array_free; left alone when
+ * there are no rules and on failure Returns 0; 14001 when an argument is null or a rule has no
+ * name; the code of a query or array.
+ */
+OV_NODISCARD OV_API int md_get_custom_app_names(const mdb_db *db, tstr_array **names);
 
 OV_C_END
 

@@ -25,6 +25,14 @@ class owner
 
     T *get() const { return object_; }
 
+    // Hands the object over to a caller.
+    T *release()
+    {
+        T *const object = object_;
+        object_ = nullptr;
+        return object;
+    }
+
     // For an operation that hands an object out; what was owned before is released.
     T **out()
     {
@@ -52,6 +60,7 @@ inline void free_text(char **text)
 using owned_binding = owner<bn_binding, bn_binding_free>;
 using owned_request = owner<bn_request, bn_request_msg_free>;
 using owned_tstr_array = owner<tstr_array, tstr_array_free>;
+using owned_tstring = owner<tstring, ts_free>;
 using owned_text = owner<char, free_text>;
 
 } // namespace ovmd
