@@ -3,7 +3,10 @@
 #include "framework/appliance.h"
 #include "host/framework/c_boundary.h"
 #include "host/framework/objects.h"
+#include "host/tree/name.h"
 #include "host/tree/value_type.h"
+#include "orvale/md_xmap_common.h"
+#include "orvale/opkt_proto.h"
 
 #include <algorithm>
 #include <array>
@@ -47,24 +50,19 @@ bool is_port_or_range(std::string_view value)
     return first && last && *first <= *last;
 }
 
-bool is_letter(char character)
+/// What the library looks a label up with, and nothing else: no wildcard, no further component.
+bool is_label(std::string_view value)
 {
-    return (character >= 'a' && character <= 'z') || (character >= 'A' && character <= 'Z');
-}
-
-bool is_digit(char character)
-{
-    return character >= '0' && character <= '9';
+    const auto pattern = NamePattern::parse("/" + std::string(value));
+    return pattern && pattern->parts().size() == 1 && pattern->parts().front().has_value();
 }
 
 bool is_protocol(std::string_view value)
 {
-    if (std::ranges::all_of(value, is_digit)) {
-        return parse_number(value, 255).has_value();
-    }
-    return std::ranges::all_of(value, [](char character) {
-        return is_letter(character) || is_digit(character) || character == '-' || character == '+';
-    });
+    const auto has_name = [value](const lc_enum_string_map &row) {
+        return row.lesm_string != nullptr && value == row.lesm_string;
+    };
+    return parse_number(value, 255) || std::ranges::any_of(opkt_proto_map, has_name);
 }
 
 bool is_dscp(std::string_view value)
@@ -82,8 +80,12 @@ struct MatchKey {
     std::string_view expected;
 };
 
+constexpr std::size_t longest_match_string = MD_XMAP_MATCHSTR_SIZE - 1;
+
 constexpr std::string_view any_text = "a text that is not empty";
 constexpr std::string_view a_prefix = "an address and a mask length, such as 10.1.0.0/16";
+constexpr std::string_view a_label =
+    "a label or a VLAN's name, which is not *, with any slash in it written as \\/";
 constexpr std::string_view a_port = "a port from 0 to 65535 or a range such as 8000-8080";
 
 constexpr std::array<MatchKey, 10> match_keys = {{
@@ -94,8 +96,8 @@ constexpr std::array<MatchKey, 10> match_keys = {{
     {"dst_ip", is_prefix, a_prefix},
     {"src_port", is_port_or_range, a_port},
     {"dst_port", is_port_or_range, a_port},
-    {"vlan", is_text, any_text},
-    {"protocol", is_protocol, "a number from 0 to 255 or a protocol's name"},
+    {"vlan", is_label, a_label},
+    {"protocol", is_protocol, "a number from 0 to 255 or a protocol's name such as tcp"},
     {"dscp", is_dscp, "a number from 0 to 63, cs0 to cs7, af11 to af43, ef or any"},
 }};
 
@@ -158,6 +160,9 @@ std::optional<std::string> parse_match_string(std::string_view text, MatchString
 {
     if (text.empty()) {
         return "it is empty; write key:value pairs joined by commas, or any";
+    }
+    if (text.size() > longest_match_string) {
+        return "it is longer than " + std::to_string(longest_match_string) + " characters";
     }
     MatchString parsed;
     if (text != "any") {

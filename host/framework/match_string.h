@@ -3,17 +3,19 @@
 // all traffic. framework/appliance.h has the operation; vlan_name.cpp is the other parser of it.
 //
 // A key may be written in capitals and stands once at most; the value begins after the first colon,
-// so an IPv6 prefix needs no quoting.
+// so an IPv6 prefix needs no quoting. The whole string has at most 1023 characters, the room that
+// the library has for one.
 //
 // Key                              Value
 // application app_group tbehavior  any text
 // src_ip dst_ip                    address/length, IPv4 or IPv6
 // src_port dst_port                a port, or a range of ports such as 8000-8080
-// vlan                             any text: a label, or a VLAN's name
-// protocol                         a number from 0 to 255, or a name of letters, digits, "-" and
-// "+" dscp                             a number from 0 to 63, cs0 to cs7, af11 to af43, ef or any
+// vlan                             a label, or a VLAN's name, as a component of a node's name
+// protocol                         a number from 0 to 255, or a name of orvale/opkt_proto.h
+// dscp                             a number from 0 to 63, cs0 to cs7, af11 to af43, ef or any
 //
-// A text in a value is not empty and holds no comma.
+// A text in a value is not empty and holds no comma. The library makes a pattern of node names from
+// a "vlan" to look for the label: one that were a wildcard there would be every label.
 
 #include <optional>
 #include <string>

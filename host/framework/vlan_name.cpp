@@ -1,7 +1,7 @@
 // ovlan_valid_name_check of framework/appliance.h.
 //
 // A VLAN's interface gets its name in the kernel, whose rules are the first half; a name that says
-// which VLAN it is ("vlan7", "eth0.7") must say a number that VLANs have.
+// which VLAN it is ("7", "vlan7", "eth0.7") must say a number that VLANs have.
 #include "framework/appliance.h"
 
 #include <algorithm>
@@ -22,7 +22,8 @@ bool is_digit(char character)
 
 bool is_refused_by_kernel(char character)
 {
-    constexpr std::string_view refused = "/: \t\n\v\f\r";
+    // The kernel knows one blank beyond ASCII's, and takes "%" for the place of a number.
+    constexpr std::string_view refused = "/:% \t\n\v\f\r\xa0";
     return refused.find(character) != std::string_view::npos;
 }
 
@@ -36,7 +37,7 @@ bool is_interface_name(std::string_view name)
 std::string_view number_in(std::string_view name)
 {
     constexpr std::string_view vlan = "vlan";
-    std::string_view digits;
+    std::string_view digits = name;
     if (const std::size_t dot = name.rfind('.'); dot != std::string_view::npos) {
         digits = name.substr(dot + 1);
     } else if (name.starts_with(vlan)) {

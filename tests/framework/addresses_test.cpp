@@ -21,6 +21,9 @@ TEST(MaskLength, OfMasksAndLengths)
         {"255.255.254.0", "23"},
         {"0", "0"},
         {"16", "16"},
+        {"32", "32"},
+        // A length of its own tells no family: 33 is one of IPv6.
+        {"33", "33"},
         {"032", "32"},
         {"128", "128"},
         {"ffff:ffff::", "32"},

@@ -1,6 +1,7 @@
 #include "host/framework/match_string.h"
 
 #include "framework/appliance.h"
+#include "orvale/opkt_proto.h"
 #include "tests/framework/allocation_failure.h"
 #include "tests/framework/owned.h"
 
@@ -101,10 +102,18 @@ constexpr ValueCase value_cases[] = {
     {"protocol:256", false},
     {"protocol:99999999999999999999", false},
     {"protocol:tcp", true},
-    {"protocol:ipv6-icmp", true},
-    {"protocol:tcp+udp", true},
-    {"protocol:3pc", true},
+    {"protocol:ip", true},
+    {"protocol:tp++", true},
+    {"protocol:raw", true},
+    {"protocol:ipproto-198", true},
+    {"protocol:ipproto-199", false},
+    {"protocol:ipv6-icmp", false},
+    {"protocol:TCP", false},
     {"protocol:", false},
+    {"protocol:-5", false},
+    {"protocol: 6", false},
+    {"protocol:17abc", false},
+    {"protocol:4294967302", false},
     {"protocol:tcp_udp", false},
     {"protocol:t cp", false},
     {"dscp:0", true},
@@ -127,6 +136,21 @@ constexpr ValueCase value_cases[] = {
     {"tbehavior:", false},
     {"vlan:", false},
     {"vlan:a name with blanks", true},
+    {"vlan:*", false},
+    {"vlan:\\*", true},
+    {"vlan:wan*", true},
+    {"vlan:a/b", false},
+    {"vlan:a\\/b", true},
+    {"vlan:*/*", false},
+    {"vlan:/", false},
+    {"vlan:a\\", false},
+    {"application:*", true},
+    {"src_ip:010.1.2.3/8", false},
+    {"src_ip:10.1.2.3/", false},
+    {"src_ip:10.1.2.3/-1", false},
+    {"src_ip:10.1.2.3/255.0.0.0", false},
+    {"dst_ip:::ffff:10.1.2.3/96", true},
+    {"dst_ip:2001:db8/32", false},
 };
 
 TEST_F(MatchStringOperation, ValuesByKey)
@@ -158,9 +182,11 @@ TEST_F(MatchStringOperation, ReasonsNameThePairAndSayWhatToWrite)
                           "range such as 8000-8080"},
         {"src_ip:10.1", "pair \"src_ip:10.1\": the value must be an address and a mask length, "
                         "such as 10.1.0.0/16"},
-        {"vlan:", "pair \"vlan:\": the value must be a text that is not empty"},
+        {"vlan:", "pair \"vlan:\": the value must be a label or a VLAN's name, which is not *, "
+                  "with any slash in it written as \\/"},
+        {"tbehavior:", "pair \"tbehavior:\": the value must be a text that is not empty"},
         {"protocol:a/b", "pair \"protocol:a/b\": the value must be a number from 0 to 255 or a "
-                         "protocol's name"},
+                         "protocol's name such as tcp"},
         {"dscp:64", "pair \"dscp:64\": the value must be a number from 0 to 63, cs0 to cs7, af11 "
                     "to af43, ef or any"},
     };
@@ -174,6 +200,30 @@ TEST_F(MatchStringOperation, ABlankAfterACommaIsPartOfTheKey)
 {
     EXPECT_EQ(validate("vlan:a, dscp:1"), 14012);
     EXPECT_THAT(reason.get(), HasSubstr("pair \" dscp:1\""));
+}
+
+TEST_F(MatchStringOperation, HasAtMost1023Characters)
+{
+    const std::string key = "application:";
+    EXPECT_EQ(validate((key + std::string(1023 - key.size(), 'a')).c_str()), 0);
+    EXPECT_EQ(validate((key + std::string(1024 - key.size(), 'a')).c_str()), 14012);
+    EXPECT_STREQ(reason.get(), "it is longer than 1023 characters");
+    EXPECT_EQ(keys.get(), nullptr);
+}
+
+// Every name of the library's table is a protocol here: what an older configuration named is good
+// in a match string.
+TEST_F(MatchStringOperation, KnowsEveryProtocolOfTheTable)
+{
+    int names = 0;
+    for (const lc_enum_string_map &row : opkt_proto_map) {
+        if (row.lesm_string != nullptr) {
+            EXPECT_EQ(validate((std::string("protocol:") + row.lesm_string).c_str()), 0)
+                << row.lesm_string;
+            ++names;
+        }
+    }
+    EXPECT_EQ(names, 256);
 }
 
 TEST_F(MatchStringOperation, NullArguments)
