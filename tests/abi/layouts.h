@@ -17,6 +17,9 @@
 #include "orvale/md_db_default.h"
 #include "orvale/md_tunbin_ht.h"
 #include "orvale/md_tunneld_defs.h"
+#include "orvale/md_xmap_common.h"
+#include "orvale/opkt_proto.h"
+#include "orvale/ov_xmap.h"
 
 #include <assert.h>
 #include <stdalign.h>
@@ -85,6 +88,9 @@ SIZE_IS(tunalias_assoc, 2097152);
 VALUE_IS(sizeof lc_error_code_map / sizeof lc_error_code_map[0], 40);
 VALUE_IS(sizeof bn_type_map / sizeof bn_type_map[0], 45);
 
+SIZE_IS(opkt_proto_map, 4112);
+VALUE_IS(sizeof opkt_proto_map / sizeof opkt_proto_map[0], 257);
+
 VALUE_IS(ba_value, 1);
 VALUE_IS(bt_uint32, 5);
 VALUE_IS(bt_bool, 9);
@@ -127,5 +133,15 @@ VALUE_IS(ov_log_info, 6);
 VALUE_IS(ov_log_debug, 7);
 VALUE_IS(lc_log_flags_default, 2048);
 VALUE_IS(ov_log_module_ovmd, 8);
+VALUE_IS(MAP_TYPE_R, 0);
+VALUE_IS(MAP_TYPE_O, 1);
+VALUE_IS(MAP_TYPE_Q, 2);
+VALUE_IS(MAP_TYPE_S, 3);
+VALUE_IS(MAP_TYPE_N, 4);
+VALUE_IS(MAP_TYPE_SEC, 5);
+VALUE_IS(MAP_TYPE_RTMAP, 6);
+VALUE_IS(MAP_TYPE_DNS_PROXY, 7);
+VALUE_IS(MD_XMAP_REFUSED, 80000);
+VALUE_IS(MD_XMAP_MATCHSTR_SIZE, 1024);
 
 #endif

@@ -17,6 +17,7 @@
 #include "orvale/md_event_common.h"
 #include "orvale/md_tunbin_ht.h"
 #include "orvale/md_tunneld_tunnel_common.h"
+#include "orvale/md_xmap_common.h"
 
 OV_C_BEGIN
 
@@ -126,6 +127,28 @@ tbool md_is_db_system_inline_router_mode(const mdb_db *);
 int md_get_number_router_mode_interfaces(const mdb_db *, int *);
 tbool md_is_10g_enabled(const mdb_db *);
 tbool md_is_bonding_enabled(const mdb_db *);
+int md_find_app_name_in_acl(const char *appName, const mdb_db *, tbool *found, tstr_array *bnames);
+int md_find_app_name_in_xxxmap(const char *appName, const mdb_db *, const char *mapNamePrefix,
+                               tbool *found, tstr_array *bnames);
+int md_find_appname_in_acl_or_xxxmap(const char *appName, const mdb_db *, char **existsInString,
+                                     tstr_array **bnames);
+int md_get_app_num_rules(const mdb_db *, const char *app_name, int *num_rules);
+int md_get_custom_app_names(const mdb_db *, tstr_array **names);
+int md_validate_proto(md_dbinfo *, const char *proto, tbool *found);
+int md_acl_ref_processing(mdb_db_change *, md_dbinfo *, int mtype);
+int md_acl_not_used_in_map(mdb_db_change *, md_dbinfo *, int mtype);
+int md_xmap_check_match_exists_for_set(mdb_db_change *, md_dbinfo *, int mtype);
+int md_xmap_common_change_check(mdb_db_change *, md_dbinfo *, int mtype, tbool *to_bail);
+int md_xmap_validate_match_str(md_dbinfo *, const char *mstr, tbool *ret_valid);
+int md_xmap_vlan_check(const mdb_db *, const char *vlan);
+tbool md_xmap_iflabel_check(const char *iflabel, const mdb_db *);
+int md_xmap_concat_key_value(char *buf, size_t buflen, const char *key, const char *value);
+int md_xmap_add_ipver(mdb_db *inout_new_db, const char *pattern);
+int md_xmap_delete_match_binding(mdb_db *, const char *bname);
+int md_xmap_delete_match_entries(mdb_db *, int mtype, const char *match_root);
+int md_xmap_upgrade_to_pattern_match(mdb_db *new_db, const mdb_db *db, int mtype);
+int md_preferred_if_is_used_in_rmap(mdb_db_change *, md_dbinfo *, tbool *ret_found);
+int md_vlan_is_used_in_rmap(mdb_db_change *, md_dbinfo *);
 int db_default_get_all(bn_str_value **, uint32 *, bn_str_value **, uint32 *);
 int db_model_def_get_all(bn_str_value **, uint32 *, bn_str_value **, uint32 *);
 int db_preserved_get_all(bn_str_value **, uint32 *, bn_str_value **, uint32 *,
