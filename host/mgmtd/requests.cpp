@@ -7,7 +7,7 @@
 #include "host/framework/log_config.h"
 #include "host/framework/time_refresh.h"
 #include "host/mgmtd/show.h"
-#include "host/modules/load_text.h"
+#include "host/modules/legacy_upgrade.h"
 #include "host/modules/node_access.h"
 #include "host/support/version.h"
 #include "host/tree/name.h"
@@ -36,6 +36,15 @@ json change_json(const Change &change)
             {"name", join_name(change.parts)},
             {"old", value_json(change.before)},
             {"new", value_json(change.after)}};
+}
+
+json changes_json(const std::vector<Change> &changes)
+{
+    auto list = json::array();
+    for (const Change &change : changes) {
+        list.push_back(change_json(change));
+    }
+    return list;
 }
 
 json warnings_json(const std::vector<Warning> &warnings)
@@ -76,6 +85,31 @@ std::size_t count_values(const Tree &tree, Tree::Parts below)
     throw RequestError(error_code::refused, what, std::move(details));
 }
 
+std::vector<ErrorDetail> details_of(const std::vector<LineFault> &faults)
+{
+    std::vector<ErrorDetail> details;
+    details.reserve(faults.size());
+    for (const LineFault &fault : faults) {
+        details.push_back({fault.node, fault.message, "", fault.line});
+    }
+    return details;
+}
+
+[[noreturn]] void throw_bad_lines(const std::string &source, const std::vector<LineFault> &faults)
+{
+    throw RequestError(error_code::bad_lines,
+                       source + ": " + std::to_string(faults.size()) +
+                           (faults.size() == 1 ? " bad line" : " bad lines") +
+                           "; nothing was loaded",
+                       details_of(faults));
+}
+
+/// Drops the candidate's edits at the end, whatever that is.
+struct DiscardAtEnd {
+    Configuration &configuration;
+    ~DiscardAtEnd() { configuration.discard(); }
+};
+
 } // namespace
 
 struct Requests::Command {
@@ -89,6 +123,7 @@ const Requests::Command Requests::commands[] = {
     {"discard", &Requests::discard}, {"diff", &Requests::diff_candidate},
     {"check", &Requests::check},     {"commit", &Requests::commit},
     {"status", &Requests::status},   {"show", &Requests::show},
+    {"upgrade", &Requests::upgrade},
 };
 
 Requests::Requests(Configuration &configuration, DaemonView daemon)
@@ -172,15 +207,7 @@ json Requests::load(const json &request)
     const LoadResult result = load_text(configuration_.candidate(), required_text(request, "text"));
     const std::string source = optional_text(request, "source", "text");
     if (!result.faults.empty()) {
-        std::vector<ErrorDetail> details;
-        details.reserve(result.faults.size());
-        for (const LineFault &fault : result.faults) {
-            details.push_back({fault.node, fault.message, "", fault.line});
-        }
-        const std::string message = source + ": " + std::to_string(details.size()) +
-                                    (details.size() == 1 ? " bad line" : " bad lines") +
-                                    "; nothing was loaded";
-        throw RequestError(error_code::bad_lines, message, std::move(details));
+        throw_bad_lines(source, result.faults);
     }
     log_host_line(ov_log_info, "mgmtd", "loaded " + source);
     return {{"set", result.set}, {"removed", result.removed}};
@@ -195,11 +222,8 @@ json Requests::discard(const json &)
 
 json Requests::diff_candidate(const json &)
 {
-    auto changes = json::array();
-    for (const Change &change : configuration_.candidate().pending(configuration_.running())) {
-        changes.push_back(change_json(change));
-    }
-    return {{"changes", std::move(changes)}};
+    return {
+        {"changes", changes_json(configuration_.candidate().pending(configuration_.running()))}};
 }
 
 json Requests::check(const json &)
@@ -211,20 +235,56 @@ json Requests::check(const json &)
     return {{"changes", report.changes.size()}, {"warnings", warnings_json(report.warnings)}};
 }
 
-json Requests::commit(const json &request)
+/// Commits the candidate; anything but an accepted commit is thrown.
+CommitReport Requests::store_candidate(const std::string &comment, const char *refusal)
 {
-    const std::string comment = optional_text(request, "comment");
     daemon_.before_events();
-    const CommitReport report = configuration_.commit(comment);
+    CommitReport report = configuration_.commit(comment);
     if (report.outcome == CommitOutcome::not_stored) {
         throw RequestError(error_code::internal, report.store_error);
     }
     if (!report.accepted()) {
-        throw_refused("the commit is refused", report.refusals);
+        throw_refused(refusal, report.refusals);
     }
+    return report;
+}
+
+json Requests::commit(const json &request)
+{
+    const CommitReport report =
+        store_candidate(optional_text(request, "comment"), "the commit is refused");
     const bool committed = report.outcome == CommitOutcome::committed;
     return {{"number", configuration_.commit_number()},
             {"changes", committed ? report.changes.size() : 0},
+            {"warnings", warnings_json(report.warnings)}};
+}
+
+json Requests::upgrade(const json &request)
+{
+    const std::string text = required_text(request, "text");
+    const std::string source = optional_text(request, "source", "text");
+    Candidate &candidate = configuration_.candidate();
+    // They would be stored with the upgrade, or be lost with it.
+    if (!candidate.pending(configuration_.running()).empty()) {
+        throw RequestError(error_code::refused,
+                           "the candidate has edits: commit or discard them first");
+    }
+    const DiscardAtEnd restore{configuration_};
+    configuration_.discard();
+    const LegacyUpgrade result = upgrade_legacy(candidate, text);
+    if (!result.line_faults.empty()) {
+        throw_bad_lines(source, result.line_faults);
+    }
+    if (!result.entry_faults.empty()) {
+        throw RequestError(error_code::refused, "entries cannot be upgraded; nothing was stored",
+                           details_of(result.entry_faults));
+    }
+    const CommitReport report =
+        store_candidate("upgrade from " + source, "the upgraded configuration is refused");
+    return {{"converted", result.converted},
+            {"by_acl", result.by_acl},
+            {"number", configuration_.commit_number()},
+            {"changes", changes_json(report.changes)},
             {"warnings", warnings_json(report.warnings)}};
 }
 

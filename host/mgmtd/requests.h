@@ -45,6 +45,9 @@ class Requests : public RequestHandler
     nlohmann::json commit(const nlohmann::json &request);
     nlohmann::json status(const nlohmann::json &request);
     nlohmann::json show(const nlohmann::json &request);
+    nlohmann::json upgrade(const nlohmann::json &request);
+
+    CommitReport store_candidate(const std::string &comment, const char *refusal);
 
     Configuration &configuration_;
     DaemonView daemon_;

@@ -40,6 +40,12 @@ constexpr ArgumentSpec load_arguments[] = {
      "input"},
 };
 
+constexpr ArgumentSpec upgrade_arguments[] = {
+    {positional, "file",
+     "A file of lines NAME,TYPE,VALUE in which the entries of maps have a node for each field; it "
+     "is only read; - is standard input"},
+};
+
 constexpr ArgumentSpec commit_arguments[] = {
     {text, "comment", "A remark for mgmtd's log"},
 };
@@ -152,6 +158,11 @@ constexpr Command table[] = {
      no_arguments,
      render_discard,
      "the change"},
+    {"upgrade",
+     "Convert a legacy configuration, show what changes, and commit it if all of it could be "
+     "converted",
+     "ovctl upgrade legacy.db", upgrade_arguments, "upgrade", load_request, render_upgrade,
+     "the file"},
     {"status",
      "Print facts about the daemon",
      "ovctl status",

@@ -79,6 +79,14 @@ void print_change(const json &change, std::ostream &out)
         << type_and_value(change.at(added ? "new" : "old")) << '\n';
 }
 
+void print_commit(const json &result, long change_count, std::ostream &out)
+{
+    if (change_count == 0)
+        out << "nothing to commit\n";
+    else
+        out << "commit " << count_of(result, "number") << ": " << changes(change_count) << '\n';
+}
+
 } // namespace
 
 void render_nothing(const json &, std::ostream &) {}
@@ -104,17 +112,22 @@ void render_check(const json &result, std::ostream &out)
 void render_commit(const json &result, std::ostream &out)
 {
     print_warnings(result, out);
-    if (count_of(result, "changes") == 0)
-        out << "nothing to commit\n";
-    else
-        out << "commit " << count_of(result, "number") << ": "
-            << changes(count_of(result, "changes")) << '\n';
+    print_commit(result, count_of(result, "changes"), out);
 }
 
 void render_diff(const json &result, std::ostream &out)
 {
     for (const json &change : result.at("changes"))
         print_change(change, out);
+}
+
+void render_upgrade(const json &result, std::ostream &out)
+{
+    render_diff(result, out);
+    print_warnings(result, out);
+    out << counted(count_of(result, "converted"), "entry", "entries")
+        << " converted to match strings, " << count_of(result, "by_acl") << " by ACL as before\n";
+    print_commit(result, static_cast<long>(result.at("changes").size()), out);
 }
 
 void render_discard(const json &result, std::ostream &out)

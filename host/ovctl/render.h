@@ -15,6 +15,7 @@ void render_nodes(const nlohmann::json &result, std::ostream &out);
 void render_load(const nlohmann::json &result, std::ostream &out);
 void render_check(const nlohmann::json &result, std::ostream &out);
 void render_commit(const nlohmann::json &result, std::ostream &out);
+void render_upgrade(const nlohmann::json &result, std::ostream &out);
 void render_diff(const nlohmann::json &result, std::ostream &out);
 void render_discard(const nlohmann::json &result, std::ostream &out);
 void render_status(const nlohmann::json &result, std::ostream &out);
