@@ -28,21 +28,26 @@ void bail_quiet_debug(void);
 /* Writes one error line of the calling function. */
 #define BAIL_LOG(...) ((void)BAIL_LOG_AT(__func__, bail_unit, __LINE__, __VA_ARGS__))
 
-/* Reports a failing status and hands it back; `err` is not 0. */
-static inline int bail_report_error(int err, const char *function, const char *unit, int line)
+/* Writes the line of a status, of a cancelled operation too. */
+static inline void bail_log_code(int err, const char *function, const char *unit, int line)
 {
-    const char *text = NULL;
+    const char *const text = lc_enum_to_string_quiet_null(lc_error_code_map, (uint32)err);
 
-    if (err == lc_err_cancelled) {
-        bail_quiet_debug();
-        return err;
-    }
-    text = lc_enum_to_string_quiet_null(lc_error_code_map, (uint32)err);
     if (text != NULL) {
         BAIL_LOG_AT(function, unit, line, "Error code %d (%s) returned", err, text);
     } else {
         BAIL_LOG_AT(function, unit, line, "Error code %d returned", err);
     }
+}
+
+/* Reports a failing status and hands it back; `err` is not 0. */
+static inline int bail_report_error(int err, const char *function, const char *unit, int line)
+{
+    if (err == lc_err_cancelled) {
+        bail_quiet_debug();
+        return err;
+    }
+    bail_log_code(err, function, unit, line);
     bail_debug();
     return err;
 }

@@ -166,8 +166,8 @@ OV_API int tunnel_sorted_seq_compare(const void *id1, const void *id2);
  *
  * found   may be null; left alone on failure
  * bnames  receives the full names of the nodes that name it at its end; null: the search ends at
- * the first. Names appended before a failure stay there. Returns 0; 14001 when db is null; the code
- * of a query or of bnames.
+ *         the first. Names appended before a failure stay there.
+ * Returns 0; 14001 when db is null; the code of a query or of bnames.
  */
 OV_NODISCARD OV_API int md_find_app_name_in_acl(const char *appName, const mdb_db *db, tbool *found,
                                                 tstr_array *bnames);
@@ -175,7 +175,7 @@ OV_NODISCARD OV_API int md_find_app_name_in_acl(const char *appName, const mdb_d
 /*
  * The same for the entries of the maps under a root.
  *
- * mapNamePrefix  the root, such as "/ov/tunneld/route_map/config/map"
+ * mapNamePrefix  the root, such as "/ov/tunneld/route_map/config/map"; null is 14001
  */
 OV_NODISCARD OV_API int md_find_app_name_in_xxxmap(const char *appName, const mdb_db *db,
                                                    const char *mapNamePrefix, tbool *found,
@@ -209,8 +209,8 @@ OV_NODISCARD OV_API int md_get_app_num_rules(const mdb_db *db, const char *app_n
  * The names that application rules carry, each once, at the place of its last rule.
  *
  * names  receives a new array, which the caller releases with tstr_array_free; left alone when
- * there are no rules and on failure Returns 0; 14001 when an argument is null or a rule has no
- * name; the code of a query or array.
+ *        there are no rules and on failure
+ * Returns 0; 14001 when an argument is null or a rule has no name; the code of a query or array.
  */
 OV_NODISCARD OV_API int md_get_custom_app_names(const mdb_db *db, tstr_array **names);
 

@@ -5,7 +5,7 @@
  * A map is a list of entries, each at a priority; an entry says which traffic it is about by an ACL
  * or by a match string, and sets parameters for it. The entry of priority "65535" is the default
  * one of its map: it is neither counted nor does it refer to an ACL. ov_xmap.h has the kinds of
- * maps; an unknown one is logged where that is told and never refused.
+ * maps. A check that is asked about an unknown kind logs that and answers 0.
  *
  * The functions with a `dbinfo` are for checks of a commit: they see the database as it was, the
  * database as it is meant to be and, one at a time, the changed nodes. Where they refuse, they set
@@ -55,10 +55,11 @@ OV_NODISCARD OV_API int md_acl_ref_processing(mdb_db_change *change, md_dbinfo *
 
 /*
  * Refuses the removal of an ACL while an entry of a map of the kind names it in the new database.
- * The entries are found by the references of the old database.
+ * The entries are found by the references of the old database. Of the ACL's name 255 characters
+ * count.
  *
- * Returns 0, refused or not; 14001 when an argument is null or memory has run out; the code of a
- * query.
+ * Returns 0, refused or not; 14001 when an argument is null, a reference has too short a name or
+ * memory has run out; the code of a query.
  */
 OV_NODISCARD OV_API int md_acl_not_used_in_map(mdb_db_change *change, md_dbinfo *dbinfo, int mtype);
 
@@ -76,9 +77,13 @@ OV_NODISCARD OV_API int md_xmap_check_match_exists_for_set(mdb_db_change *change
 
 /*
  * What is checked for every change of a map: the limits of maps and entries, and then that an entry
- * matches before it sets. A new map is refused when the old database has ten of its kind, a new
- * entry when it has twice the model's number of entries, in all maps of the kind together. The
- * entries of NAT and DNS-proxy maps are not counted, and a new DNS-proxy map is always refused.
+ * matches before it sets.
+ *
+ * A new map is refused when the old database has ten of its kind; there is no limit of security
+ * maps, and no room for any DNS-proxy map of the VRF "0". A new entry is refused when the old
+ * database has twice the model's number of entries in all maps of the kind together, the security
+ * map's under "map1" alone. The entries of NAT and DNS-proxy maps are not counted: they are refused
+ * only where the model's number is 0. An unknown kind is logged and has no limits.
  *
  * to_bail  receives whether the change is refused and is to be checked no further
  * Returns 0, refused or not; 14001 when an argument is null or memory has run out; the code of a
@@ -102,7 +107,7 @@ OV_NODISCARD OV_API int md_xmap_common_change_check(mdb_db_change *change, md_db
  *
  * ret_valid  receives true, or false after such a refusal
  * Returns 0; -1 when a "vlan" is neither a label nor a name that a VLAN may have, which leaves
- * ret_valid true and sets no message; 14001 when an argument is null, or a key is without a value.
+ * ret_valid true and sets no message; 14001 when an argument is null.
  */
 OV_NODISCARD OV_API int md_xmap_validate_match_str(md_dbinfo *dbinfo, const char *mstr,
                                                    tbool *ret_valid);
@@ -158,8 +163,8 @@ OV_NODISCARD OV_API int md_xmap_delete_match_entries(mdb_db *db, int mtype, cons
  * mtype  one of the five kinds that have an older form: MAP_TYPE_R to MAP_TYPE_N
  * Returns 0; 14002 for another kind, of which nothing is touched; 14001 when a database is null;
  * the code of a query, a mask's conversion or the write, which ends the upgrade: what was converted
- * stays. The code of a failing removal is logged only, but for that of the last entry when it has
- * an ACL, which is returned.
+ * stays. The code of a failing removal is logged only, but for that of an entry with an ACL when no
+ * further list or entry is read after it, which is returned.
  */
 OV_NODISCARD OV_API int md_xmap_upgrade_to_pattern_match(mdb_db *new_db, const mdb_db *db,
                                                          int mtype);
@@ -179,9 +184,10 @@ OV_NODISCARD OV_API int md_preferred_if_is_used_in_rmap(mdb_db_change *change, m
  * Refuses the removal of a VLAN that an entry of a route map has for its preferred interface. The
  * entries are those of the new database, their values those of the old one.
  *
- * change  the removed node, whose name component 7 (counted from 0) is the VLAN's name, of which
- * 255 characters count Returns 0, refused or not; 14001 when an argument is null, the name has no
- * such component or memory has run out; the code of a query.
+ * change  the removed node; component 7 of its name (counted from 0) is the VLAN's name, cut at 255
+ *         characters
+ * Returns 0, refused or not; 14001 when an argument is null, the name has no such component or
+ * memory has run out; the code of a query.
  */
 OV_NODISCARD OV_API int md_vlan_is_used_in_rmap(mdb_db_change *change, md_dbinfo *dbinfo);
 

@@ -197,6 +197,9 @@ class entry_upgrade
         if (err != 0) {
             return err;
         }
+        if (length.get() == nullptr) {
+            return lc_err_unexpected_null;
+        }
         char prefix[address_size];
         (void)snprintf(prefix, sizeof prefix, "%s/%s", ts_str(address.get()), length.get());
         append(fields.key, prefix);
@@ -257,10 +260,11 @@ int md_xmap_upgrade_to_pattern_match(mdb_db *new_db, const mdb_db *db, int mtype
                 BAIL_ERROR(entry.convert());
                 continue;
             }
-            // An entry that matches by ACL keeps its other nodes and gets no match string.
+            // An entry that matches by ACL keeps its other nodes and gets no match string. That
+            // one has been passed over is told even where the operation was cancelled.
             pending = md_xmap_delete_match_entries(new_db, mtype, node);
             if (pending != 0) {
-                (void)BAIL_REPORT(pending);
+                bail_log_code(pending, __func__, bail_unit, __LINE__);
             }
         }
     }

@@ -44,10 +44,8 @@ int md_xmap_validate_match_str(md_dbinfo *dbinfo, const char *mstr, tbool *ret_v
     for (uint32 i = 0; i < num_pairs; ++i) {
         const char *const key = tstr_array_get_str_quick(keys.get(), i);
         BAIL_NULL(key);
-        const char *const value = part_of(values.get(), i);
-        BAIL_NULL(value);
         if (strcasecmp(key, vlan_key) == 0) {
-            BAIL_ERROR(md_xmap_vlan_check(dbinfo->newdb, value));
+            BAIL_ERROR(md_xmap_vlan_check(dbinfo->newdb, part_of(values.get(), i)));
         }
     }
     return 0;
