@@ -1,6 +1,7 @@
 #include "host/control/connection.h"
 
 #include "host/control/message.h"
+#include "host/support/user_name.h"
 
 #include <event2/event.h>
 #include <nlohmann/json.hpp>
@@ -31,7 +32,12 @@ ClientInfo credentials_of(int fd, std::uint64_t number)
     socklen_t size = sizeof(credentials);
     if (::getsockopt(fd, SOL_SOCKET, SO_PEERCRED, &credentials, &size) != 0)
         throw std::runtime_error(std::string("cannot tell who connected: ") + std::strerror(errno));
-    return {.number = number, .pid = credentials.pid, .uid = credentials.uid, .peer = {}};
+    return {.number = number,
+            .pid = credentials.pid,
+            .uid = credentials.uid,
+            .gid = credentials.gid,
+            .user = user_name(credentials.uid),
+            .peer = {}};
 }
 
 EventPtr new_event(EventLoop &loop, int fd, short what, event_callback_fn callback, void *context)

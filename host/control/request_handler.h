@@ -13,12 +13,15 @@
 namespace ovhost
 {
 
-/// Who asks. `pid` and `uid` are those the client had when it connected; `peer` is the name it
-/// registered under, or empty.
+/// Who asks. `pid`, `uid` and `gid` are those the client had when it connected; `user` is the name
+/// of `uid`, or its digits when the machine knows no name for it; `peer` is the name it registered
+/// under, or empty.
 struct ClientInfo {
     std::uint64_t number = 0;
     pid_t pid = 0;
     uid_t uid = 0;
+    gid_t gid = 0;
+    std::string user;
     std::string peer;
 };
 

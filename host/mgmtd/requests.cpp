@@ -114,7 +114,7 @@ struct DiscardAtEnd {
 
 struct Requests::Command {
     const char *name;
-    json (Requests::*handler)(const json &);
+    json (Requests::*handler)(const json &request, const ClientInfo &client);
 };
 
 const Requests::Command Requests::commands[] = {
@@ -131,7 +131,7 @@ Requests::Requests(Configuration &configuration, DaemonView daemon)
 {
 }
 
-json Requests::handle(const json &request, const ClientInfo &)
+json Requests::handle(const json &request, const ClientInfo &client)
 {
     const std::string name = required_text(request, "command");
     const auto *const command =
@@ -141,10 +141,10 @@ json Requests::handle(const json &request, const ClientInfo &)
         throw RequestError(error_code::unknown_command, "unknown command \"" + name + "\"");
     }
     refresh_time_info();
-    return (this->*command->handler)(request);
+    return (this->*command->handler)(request, client);
 }
 
-json Requests::get(const json &request)
+json Requests::get(const json &request, const ClientInfo &)
 {
     const auto name = required_name(request);
     const std::string from = optional_text(request, "from", "running");
@@ -172,7 +172,7 @@ json Requests::get(const json &request)
     return {{"nodes", std::move(nodes)}};
 }
 
-json Requests::set(const json &request)
+json Requests::set(const json &request, const ClientInfo &)
 {
     const std::string name = required_text(request, "name");
     const std::string type_text = required_text(request, "type");
@@ -187,7 +187,7 @@ json Requests::set(const json &request)
     return json::object();
 }
 
-json Requests::erase(const json &request)
+json Requests::erase(const json &request, const ClientInfo &)
 {
     const auto name = required_name(request);
     if (name.empty()) {
@@ -202,7 +202,7 @@ json Requests::erase(const json &request)
     return {{"removed", removed}};
 }
 
-json Requests::load(const json &request)
+json Requests::load(const json &request, const ClientInfo &)
 {
     const LoadResult result = load_text(configuration_.candidate(), required_text(request, "text"));
     const std::string source = optional_text(request, "source", "text");
@@ -213,20 +213,20 @@ json Requests::load(const json &request)
     return {{"set", result.set}, {"removed", result.removed}};
 }
 
-json Requests::discard(const json &)
+json Requests::discard(const json &, const ClientInfo &)
 {
     const auto dropped = configuration_.candidate().pending(configuration_.running()).size();
     configuration_.discard();
     return {{"changes", dropped}};
 }
 
-json Requests::diff_candidate(const json &)
+json Requests::diff_candidate(const json &, const ClientInfo &)
 {
     return {
         {"changes", changes_json(configuration_.candidate().pending(configuration_.running()))}};
 }
 
-json Requests::check(const json &)
+json Requests::check(const json &, const ClientInfo &)
 {
     const CheckReport report = configuration_.check();
     if (!report.accepted()) {
@@ -249,7 +249,7 @@ CommitReport Requests::store_candidate(const std::string &comment, const char *r
     return report;
 }
 
-json Requests::commit(const json &request)
+json Requests::commit(const json &request, const ClientInfo &)
 {
     const CommitReport report =
         store_candidate(optional_text(request, "comment"), "the commit is refused");
@@ -259,7 +259,7 @@ json Requests::commit(const json &request)
             {"warnings", warnings_json(report.warnings)}};
 }
 
-json Requests::upgrade(const json &request)
+json Requests::upgrade(const json &request, const ClientInfo &)
 {
     const std::string text = required_text(request, "text");
     const std::string source = optional_text(request, "source", "text");
@@ -288,7 +288,7 @@ json Requests::upgrade(const json &request)
             {"warnings", warnings_json(report.warnings)}};
 }
 
-json Requests::status(const json &)
+json Requests::status(const json &, const ClientInfo &)
 {
     auto peers = json::array();
     for (const PeerStatus &peer : daemon_.peers()) {
@@ -313,7 +313,7 @@ json Requests::status(const json &)
         {"uptime_seconds", uptime.count()}};
 }
 
-json Requests::show(const json &request)
+json Requests::show(const json &request, const ClientInfo &)
 {
     return answer_show(configuration_, request);
 }

@@ -35,17 +35,17 @@ class Requests : public RequestHandler
     struct Command;
     static const Command commands[];
 
-    nlohmann::json get(const nlohmann::json &request);
-    nlohmann::json set(const nlohmann::json &request);
-    nlohmann::json erase(const nlohmann::json &request);
-    nlohmann::json load(const nlohmann::json &request);
-    nlohmann::json discard(const nlohmann::json &request);
-    nlohmann::json diff_candidate(const nlohmann::json &request);
-    nlohmann::json check(const nlohmann::json &request);
-    nlohmann::json commit(const nlohmann::json &request);
-    nlohmann::json status(const nlohmann::json &request);
-    nlohmann::json show(const nlohmann::json &request);
-    nlohmann::json upgrade(const nlohmann::json &request);
+    nlohmann::json get(const nlohmann::json &request, const ClientInfo &client);
+    nlohmann::json set(const nlohmann::json &request, const ClientInfo &client);
+    nlohmann::json erase(const nlohmann::json &request, const ClientInfo &client);
+    nlohmann::json load(const nlohmann::json &request, const ClientInfo &client);
+    nlohmann::json discard(const nlohmann::json &request, const ClientInfo &client);
+    nlohmann::json diff_candidate(const nlohmann::json &request, const ClientInfo &client);
+    nlohmann::json check(const nlohmann::json &request, const ClientInfo &client);
+    nlohmann::json commit(const nlohmann::json &request, const ClientInfo &client);
+    nlohmann::json status(const nlohmann::json &request, const ClientInfo &client);
+    nlohmann::json show(const nlohmann::json &request, const ClientInfo &client);
+    nlohmann::json upgrade(const nlohmann::json &request, const ClientInfo &client);
 
     CommitReport store_candidate(const std::string &comment, const char *refusal);
 

@@ -8,6 +8,7 @@
 #include "tests/control/test_server.h"
 
 #include <gtest/gtest.h>
+#include <pwd.h>
 #include <sys/resource.h>
 #include <unistd.h>
 
@@ -102,16 +103,24 @@ TEST(ServerTest, AHandlerThatFailsIsAnInternalErrorAndALogLine)
 TEST(ServerTest, TheHandlerKnowsWhoAsks)
 {
     TestServer server([](const json &, const ClientInfo &client) -> json {
-        return {{"pid", client.pid}, {"uid", client.uid}, {"peer", client.peer}};
+        return {{"pid", client.pid},
+                {"uid", client.uid},
+                {"gid", client.gid},
+                {"user", client.user},
+                {"peer", client.peer}};
     });
     RawClient client(server.path());
     client.send("{\"id\":1,\"command\":\"who\"}\n{\"command\":\"hello\",\"peer\":\"p\"}\n"
                 "{\"id\":2,\"command\":\"who\"}\n");
-    const std::string who =
-        "\"pid\":" + std::to_string(::getpid()) + ",\"uid\":" + std::to_string(::getuid());
-    EXPECT_EQ(client.line(), "{\"id\":1,\"ok\":true,\"result\":{\"peer\":\"\"," + who + "}}");
+    const passwd *const entry = ::getpwuid(::getuid());
+    const std::string user = entry != nullptr ? entry->pw_name : std::to_string(::getuid());
+    const std::string pid = "\"pid\":" + std::to_string(::getpid());
+    const std::string rest =
+        pid + ",\"uid\":" + std::to_string(::getuid()) + ",\"user\":\"" + user + "\"}}";
+    const std::string gid = "{\"gid\":" + std::to_string(::getgid());
+    EXPECT_EQ(client.line(), "{\"id\":1,\"ok\":true,\"result\":" + gid + ",\"peer\":\"\"," + rest);
     EXPECT_EQ(client.line(), R"({"id":null,"ok":true,"result":{"peer":"p","protocol":1}})");
-    EXPECT_EQ(client.line(), "{\"id\":2,\"ok\":true,\"result\":{\"peer\":\"p\"," + who + "}}");
+    EXPECT_EQ(client.line(), "{\"id\":2,\"ok\":true,\"result\":" + gid + ",\"peer\":\"p\"," + rest);
 }
 
 TEST(ServerTest, AClientThatShutsDownWritingGetsItsAnswers)
