@@ -43,6 +43,8 @@ std::string bail_text(int code)
         return "Error code 14002 (assertion failed) returned";
     case code_of_table:
         return "Error code 14004 (item not found) returned";
+    case code_cancelled:
+        return "Error code 14120 (Operation cancelled) returned";
     default:
         return "Error code " + number + " returned";
     }
@@ -63,6 +65,8 @@ struct ExpectedTrace {
             lines.push_back(gated_line(line.level, text));
         } else if (line.kind == Kind::debug) {
             lines.push_back(debug_line(line.unit, line.function, text));
+        } else if (line.kind == Kind::told) {
+            lines.push_back(error_line(line.unit, line.function, bail_text(code)));
         } else if (line.kind == Kind::unexpected) {
             lines.push_back(error_line(line.unit, line.function, "Unexpected NULL"));
             ++exits;

@@ -16,14 +16,15 @@
 namespace ovtest
 {
 
-// A line that is expected in the log. For a cancelled operation only gated lines and traces are
-// written.
+// A line that is expected in the log. For a cancelled operation only what is told, gated lines and
+// traces are written.
 struct ExpectedLine {
     enum class Kind {
         bail,       // the code by the bail rule
         bail_text,  // a text of its own in place of the code's, by the bail rule
         unexpected, // "Unexpected NULL"
         error,      // an error line that is not itself an error exit
+        told,       // the code as by the bail rule, cancelled or not, without an error exit
         debug,      // a trace
         gated,      // ov_log_internal
     };
@@ -56,6 +57,10 @@ class UnitLines
     ExpectedLine error(const std::string &function, const std::string &text) const
     {
         return {ExpectedLine::Kind::error, unit_, function, text};
+    }
+    ExpectedLine told(const std::string &function) const
+    {
+        return {ExpectedLine::Kind::told, unit_, function};
     }
     ExpectedLine debug(const std::string &function, const std::string &text) const
     {
