@@ -1,5 +1,6 @@
 #include "host/commit/candidate.h"
 
+#include "host/commit/patch.h"
 #include "host/tree/name.h"
 #include "host/tree/value_type.h"
 
@@ -55,26 +56,6 @@ Fault apply_edit(Tree &tree, const Edit &edit)
     return std::nullopt;
 }
 
-/// Takes the value away from a node that may have others below it, which stay.
-void clear_value(Tree &tree, const Parts &parts)
-{
-    if (tree.value(parts) == nullptr) {
-        return;
-    }
-    std::vector<std::pair<Parts, Value>> below;
-    tree.visit(
-        [&](Tree::Parts name, const Value &value) {
-            if (name.size() > parts.size()) {
-                below.emplace_back(Parts(name.begin(), name.end()), value);
-            }
-        },
-        parts);
-    tree.erase(parts);
-    for (auto &[name, value] : below) {
-        tree.set(name, std::move(value));
-    }
-}
-
 } // namespace
 
 Candidate::Candidate(Tree running) : base_(running), tree_(std::move(running)) {}
@@ -117,25 +98,18 @@ void Candidate::discard(Tree running) noexcept
     tree_ = std::move(running);
 }
 
+void Candidate::rebase(Tree running)
+{
+    tree_ = over(running);
+    base_ = std::move(running);
+}
+
 Tree Candidate::over(const Tree &running) const
 {
     if (diff(base_, running).empty()) {
         return tree_;
     }
-    Tree result = running;
-    const std::vector<Change> edits = diff(base_, tree_);
-    // Backwards, children go before their parents, so that a parent is seldom left with any.
-    for (auto edit = edits.rbegin(); edit != edits.rend(); ++edit) {
-        if (!edit->after) {
-            clear_value(result, edit->parts);
-        }
-    }
-    for (const Change &edit : edits) {
-        if (edit.after) {
-            result.set(edit.parts, *edit.after);
-        }
-    }
-    return result;
+    return with_changes(running, diff(base_, tree_));
 }
 
 std::vector<Change> Candidate::pending(const Tree &running) const

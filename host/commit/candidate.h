@@ -8,6 +8,7 @@
 #include <optional>
 #include <span>
 #include <string>
+#include <utility>
 #include <vector>
 
 namespace ovhost
@@ -42,6 +43,12 @@ class Candidate
 
     /// Drops all edits and begins again from the running configuration.
     void discard(Tree running) noexcept;
+
+    /// Drops all edits and makes those that lead to another configuration.
+    void replace(Tree configuration) { tree_ = std::move(configuration); }
+
+    /// Keeps the edits, as over() has them, and begins again from the running configuration.
+    void rebase(Tree running);
 
     /// The configuration as edited.
     [[nodiscard]] const Tree &tree() const { return tree_; }

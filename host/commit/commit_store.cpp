@@ -14,9 +14,9 @@ void StoreAdapter::load(const std::function<void(StoredNode &&)> &take) const
     store_.load(take);
 }
 
-std::uint64_t StoreAdapter::commit(std::span<const StoredChange> changes)
+std::uint64_t StoreAdapter::commit(std::span<const StoredChange> changes, const CommitNote &note)
 {
-    return store_.commit(changes);
+    return store_.commit(changes, note);
 }
 
 Tree load_tree(const CommitStore &store)

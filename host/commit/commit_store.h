@@ -22,9 +22,9 @@ class CommitStore
     /// Hands out every node. Throws StoreError.
     virtual void load(const std::function<void(StoredNode &&)> &take) const = 0;
 
-    /// Stores one commit, all of it or nothing, and answers its number. Throws StoreError; then the
-    /// store is as it was.
-    virtual std::uint64_t commit(std::span<const StoredChange> changes) = 0;
+    /// Stores one commit with its record, all of it or nothing, and answers its number. Throws
+    /// StoreError; then the store is as it was.
+    virtual std::uint64_t commit(std::span<const StoredChange> changes, const CommitNote &note) = 0;
 };
 
 class StoreAdapter : public CommitStore
@@ -34,7 +34,7 @@ class StoreAdapter : public CommitStore
     explicit StoreAdapter(Store &store) : store_(store) {}
 
     void load(const std::function<void(StoredNode &&)> &take) const override;
-    std::uint64_t commit(std::span<const StoredChange> changes) override;
+    std::uint64_t commit(std::span<const StoredChange> changes, const CommitNote &note) override;
 
   private:
     Store &store_;

@@ -93,7 +93,7 @@ CheckReport CommitEngine::check(const Candidate &candidate)
     return {transaction.changes(), transaction.refusals(), transaction.warnings()};
 }
 
-CommitReport CommitEngine::commit(Candidate &candidate, const std::string &comment)
+CommitReport CommitEngine::commit(Candidate &candidate, const CommitNote &note)
 {
     const BusyMark mark(busy_);
     Transaction transaction(modules_, running_, candidate.over(running_));
@@ -105,7 +105,7 @@ CommitReport CommitEngine::commit(Candidate &candidate, const std::string &comme
     if (!report.refusals.empty()) {
         report.outcome = CommitOutcome::refused;
     } else if (!report.changes.empty()) {
-        put_in_force(transaction, comment, report);
+        put_in_force(transaction, note, report);
     }
     if (report.accepted()) {
         candidate.discard(running_);
@@ -114,32 +114,33 @@ CommitReport CommitEngine::commit(Candidate &candidate, const std::string &comme
     return report;
 }
 
-CommitReport CommitEngine::initial(Candidate &candidate)
+CommitReport CommitEngine::initial(Candidate &candidate, const CommitNote &note)
 {
     if (running_.size() != 0) {
         throw std::logic_error("the initial configuration needs an empty running configuration");
     }
-    return commit(candidate, "initial configuration");
+    return commit(candidate, note);
 }
 
-void CommitEngine::put_in_force(Transaction &transaction, const std::string &comment,
+void CommitEngine::put_in_force(Transaction &transaction, const CommitNote &note,
                                 CommitReport &report)
 {
-    if (!store(transaction, report)) {
+    if (!store(transaction, note, report)) {
         report.outcome = CommitOutcome::not_stored;
         return;
     }
     report.outcome = CommitOutcome::committed;
     running_ = transaction.proposed();
-    log_commit(report, comment);
+    log_commit(report, note.comment);
     transaction.apply();
     transaction.notify();
 }
 
-bool CommitEngine::store(const Transaction &transaction, CommitReport &report)
+bool CommitEngine::store(const Transaction &transaction, const CommitNote &note,
+                         CommitReport &report)
 {
     try {
-        report.commit_number = store_.commit(stored_changes(transaction.changes()));
+        report.commit_number = store_.commit(stored_changes(transaction.changes()), note);
         return true;
     } catch (const std::exception &error) {
         report.store_error = error.what();

@@ -24,6 +24,7 @@
 #include "host/commit/report.h"
 #include "host/commit/transaction.h"
 
+#include <concepts>
 #include <string>
 #include <vector>
 
@@ -53,20 +54,30 @@ class CommitEngine
     [[nodiscard]] CheckReport check(const Candidate &candidate);
 
     /// Commits the candidate. When it is accepted the candidate equals the running configuration,
-    /// amendments included; otherwise it keeps its edits. The comment goes to the log. Throws
-    /// std::logic_error when a module calls it, or check(), from inside a commit.
-    [[nodiscard]] CommitReport commit(Candidate &candidate, const std::string &comment);
+    /// amendments included; otherwise it keeps its edits. The note goes to the store, its comment
+    /// to the log as well. Throws std::logic_error when a module calls it, or check(), from inside
+    /// a commit.
+    [[nodiscard]] CommitReport commit(Candidate &candidate, const CommitNote &note);
 
     /// The first commit, on an empty running configuration: defaults come in by the same road as
     /// everything after them. Throws std::logic_error when there is a configuration already.
-    [[nodiscard]] CommitReport initial(Candidate &candidate);
+    [[nodiscard]] CommitReport initial(Candidate &candidate, const CommitNote &note = {});
+
+    template <std::same_as<std::string> Text>
+    [[nodiscard]] CommitReport commit(Candidate &candidate, const Text &comment)
+    {
+        CommitNote note;
+        note.comment = comment;
+        return commit(candidate, note);
+    }
 
   private:
     /// Steps 4 to 7 of an accepted transaction.
-    void put_in_force(Transaction &transaction, const std::string &comment, CommitReport &report);
+    void put_in_force(Transaction &transaction, const CommitNote &note, CommitReport &report);
 
     /// Step 4; false when the store has failed.
-    [[nodiscard]] bool store(const Transaction &transaction, CommitReport &report);
+    [[nodiscard]] bool store(const Transaction &transaction, const CommitNote &note,
+                             CommitReport &report);
 
     CommitStore &store_;
     std::vector<RegisteredModule> modules_;

@@ -98,6 +98,21 @@ UniqueFd open_regular(const fs::path &file)
     return opened;
 }
 
+// A copy that was put back may have come with another mode. The log is made with the mode of the
+// database, but one that was copied with it has its own.
+void close_to_others(const fs::path &file)
+{
+    for (const char *side : {"", "-wal"}) {
+        const fs::path path = file.string() + side;
+        struct stat about {
+        };
+        if (::stat(path.c_str(), &about) != 0 || (about.st_mode & 07777U) == 0600)
+            continue;
+        if (::chmod(path.c_str(), 0600) != 0)
+            throw_system("give " + path.string() + " mode 0600", errno, kPermissionAdvice);
+    }
+}
+
 // Judges the file before SQLite sees it, which would already replay the journal of another
 // program's database. A file made here is never empty, not even after a crash: an empty one has
 // lost its content, and taking it for new would make the loss silent.
@@ -135,17 +150,36 @@ void check_version(const SqliteConnection &db, const fs::path &file)
                      "); the file was left as it was: run the newer version");
 }
 
+// Nothing of the history may be missing between its first commit and the last one of all.
+void check_history(const SqliteConnection &db, const fs::path &file)
+{
+    if (db.integer("SELECT count(*) = 0 OR (max(number) = (SELECT commits FROM meta)"
+                   " AND max(number) - min(number) + 1 = count(*)) FROM commits") != 1) {
+        throw_damaged(file, "its history does not lead to its last commit");
+    }
+    if (db.integer(
+            "SELECT count(*) FROM wait"
+            " WHERE number <> (SELECT commits FROM meta)"
+            " OR back_to + 1 < (SELECT coalesce(min(number), wait.number + 1) FROM commits)") !=
+        0) {
+        throw_damaged(file, "its history lacks what a waiting commit needs");
+    }
+}
+
 void check_content(const SqliteConnection &db, const fs::path &file)
 {
     const std::string verdict = db.text("PRAGMA quick_check(1)");
     if (verdict != "ok")
         throw_damaged(file, verdict);
-    if (schema_of(db) != expected_schema(db.integer("PRAGMA user_version"))) {
+    const std::int64_t version = db.integer("PRAGMA user_version");
+    if (schema_of(db) != expected_schema(version)) {
         throw_foreign(file, "its tables are not this program's");
     }
     if (db.integer("SELECT count(*) FROM meta") != 1) {
         throw_damaged(file, "its commit number is missing");
     }
+    if (version >= kHistoryVersion)
+        check_history(db, file);
 }
 
 // Every commit is on the disk before it is acknowledged. No other process is to read or write
@@ -243,6 +277,7 @@ try {
     SqliteConnection db = connect(file);
     check_version(db, file);
     check_content(db, file);
+    close_to_others(file);
     db.checkpoint_on_close();
     use_log(db);
     upgrade_schema(db);

@@ -22,6 +22,38 @@ constexpr std::array kSteps{
            type INTEGER NOT NULL CHECK (type BETWEEN 0 AND 4294967295),
            text TEXT NOT NULL
        ) WITHOUT ROWID, STRICT;)",
+    // The history begins with the next commit: what earlier ones changed is not known.
+    R"(CREATE TABLE commits (
+           number INTEGER PRIMARY KEY CHECK (number > 0),
+           time INTEGER NOT NULL,
+           uid INTEGER CHECK (uid BETWEEN 0 AND 4294967295),
+           author TEXT NOT NULL,
+           comment TEXT NOT NULL,
+           rollback_to INTEGER,
+           changes INTEGER NOT NULL,
+           bytes INTEGER NOT NULL,
+           confirmation TEXT NOT NULL DEFAULT 'none'
+               CHECK (confirmation IN ('none', 'waiting', 'confirmed', 'undone')),
+           ended_by INTEGER,
+           undo_refusal TEXT NOT NULL DEFAULT ''
+       ) STRICT;
+       CREATE TABLE changes (
+           number INTEGER NOT NULL,
+           position INTEGER NOT NULL,
+           name TEXT NOT NULL,
+           old_type INTEGER CHECK (old_type BETWEEN 0 AND 4294967295),
+           old_text TEXT,
+           new_type INTEGER CHECK (new_type BETWEEN 0 AND 4294967295),
+           new_text TEXT,
+           PRIMARY KEY (number, position)
+       ) WITHOUT ROWID, STRICT;
+       CREATE TABLE wait (
+           id INTEGER PRIMARY KEY CHECK (id = 1),
+           number INTEGER NOT NULL,
+           back_to INTEGER NOT NULL CHECK (back_to BETWEEN 0 AND number - 1),
+           deadline INTEGER NOT NULL,
+           seconds INTEGER NOT NULL CHECK (seconds BETWEEN 0 AND 4294967295)
+       ) STRICT;)",
 };
 
 void run_steps(const SqliteConnection &db, std::int64_t from, std::int64_t to)

@@ -15,6 +15,9 @@ class SqliteConnection;
 // "ovmd": tells the store's databases from those of other programs.
 inline constexpr std::int32_t kApplicationId = 0x6f766d64;
 
+// The first version with a history.
+inline constexpr std::int64_t kHistoryVersion = 2;
+
 // The version this program writes.
 [[nodiscard]] std::int64_t schema_version() noexcept;
 

@@ -110,6 +110,11 @@ std::string Statement::text(int column) const
     return {static_cast<const char *>(bytes), static_cast<std::size_t>(size)};
 }
 
+bool Statement::is_null(int column) const
+{
+    return sqlite3_column_type(statement_.get(), column) == SQLITE_NULL;
+}
+
 void SqliteConnection::Close::operator()(sqlite3 *db) const noexcept
 {
     sqlite3_close_v2(db);

@@ -48,6 +48,7 @@ class Statement
     // A column of the present row, counted from 0.
     [[nodiscard]] std::int64_t integer(int column) const;
     [[nodiscard]] std::string text(int column) const;
+    [[nodiscard]] bool is_null(int column) const;
 
   private:
     struct Finalize {

@@ -43,6 +43,34 @@ void check_directory(const std::filesystem::path &dir)
                      "; give this user write permission, or choose another state directory");
 }
 
+// Whether the directory is this store's alone, or empty: then its mode is the store's to set.
+bool holds_only_state(const std::filesystem::path &dir)
+{
+    std::error_code fault;
+    std::filesystem::directory_iterator entries(dir, fault);
+    for (; !fault && entries != std::filesystem::directory_iterator(); entries.increment(fault)) {
+        const std::string name = entries->path().filename().string();
+        if (name != "lock" && !name.starts_with("config.db"))
+            return false;
+    }
+    return !fault;
+}
+
+// The files are their user's alone, but who may write the directory can put others in their place.
+void close_to_others(const std::filesystem::path &dir)
+{
+    struct stat about {
+    };
+    if (::stat(dir.c_str(), &about) != 0 || (about.st_mode & 077U) == 0)
+        return;
+    if (holds_only_state(dir) && ::chmod(dir.c_str(), 0700) == 0)
+        return;
+    if ((about.st_mode & 022U) == 0)
+        return;
+    throw StoreError("other users can write the state directory " + dir.string() +
+                     "; give it mode 0700, or choose another state directory");
+}
+
 UniqueFd open_lock(const std::filesystem::path &file)
 {
     UniqueFd lock(
@@ -95,6 +123,7 @@ StateDir::StateDir(std::filesystem::path dir) : path_(std::move(dir))
 {
     make_directory(path_);
     check_directory(path_);
+    close_to_others(path_);
     lock_ = open_lock(path_ / "lock");
     // flock and not fcntl: it also keeps out a second store of the same process, and does not
     // end when another descriptor of the file is closed.

@@ -12,8 +12,10 @@ namespace ovhost
 class StateDir
 {
   public:
-    // Makes the directory when it is missing and takes the lock. Throws StoreError, which names
-    // the process that has the lock when it is known.
+    // Makes the directory when it is missing and takes the lock. A directory that holds nothing
+    // else is closed to other users (mode 0700); one that holds other files too keeps its mode,
+    // and is refused when other users can write it. Throws StoreError, which names the process
+    // that has the lock when it is known.
     explicit StateDir(std::filesystem::path dir);
 
     [[nodiscard]] const std::filesystem::path &path() const noexcept { return path_; }

@@ -1,7 +1,8 @@
-// The durable store: the configuration as it was last committed, in an SQLite database
-// (config.db) of the state directory. It knows nodes only as name, type and text; the commit
-// engine hands it the changes of each commit and loads all nodes at start.
-// Neighbours: state_dir.h keeps other daemons out, database_file.h judges the file.
+// The durable store: the configuration as it was last committed and the history that led to it,
+// in an SQLite database (config.db) of the state directory. It knows nodes only as name, type and
+// text; the commit engine hands it the changes of each commit and loads all nodes at start.
+// Neighbours: commit_record.h is what is kept of a commit, state_dir.h keeps other daemons out,
+// database_file.h judges the file.
 #pragma once
 
 #include <cstdint>
@@ -11,16 +12,13 @@
 #include <optional>
 #include <span>
 #include <string>
+#include <vector>
 
+#include "host/store/commit_record.h"
 #include "host/store/store_error.h"
 
 namespace ovhost
 {
-
-struct StoredValue {
-    std::uint32_t type = 0;
-    std::string text;
-};
 
 struct StoredNode {
     std::string name;
@@ -40,7 +38,8 @@ class Store
     // Opens the store of this directory, or makes an empty one. The directory is made when only
     // its last component is missing, and is held until the store's end. Throws StoreError; what
     // was found and refused is left as it is.
-    [[nodiscard]] static Store open(const std::filesystem::path &state_dir);
+    [[nodiscard]] static Store open(const std::filesystem::path &state_dir,
+                                    const HistoryBounds &bounds = {});
 
     Store(Store &&other) noexcept;
     Store &operator=(Store &&other) noexcept;
@@ -55,10 +54,36 @@ class Store
     // Hands out every node, in the byte order of the names. Throws StoreError.
     void load(const std::function<void(StoredNode &&)> &take) const;
 
-    // Stores one commit, all of it or nothing, and answers its number. When it returns, the
-    // commit is on the disk. The changes count in their order; removing a node that is not there
-    // is no error. Throws StoreError: then the store is as it was, and can be used on.
-    std::uint64_t commit(std::span<const StoredChange> changes);
+    // Stores one commit with its record, all of it or nothing, and answers its number. When it
+    // returns, the commit is on the disk. The changes count in their order; removing a node that
+    // is not there is no error. Throws StoreError: then the store is as it was, and can be used
+    // on.
+    std::uint64_t commit(std::span<const StoredChange> changes, const CommitNote &note = {});
+
+    // The last commits, the newest first. This and what follows throw StoreError.
+    [[nodiscard]] std::vector<RecordedCommit> history(std::uint64_t limit) const;
+
+    // A commit's record; none when it is not in the history.
+    [[nodiscard]] std::optional<RecordedCommit> recorded(std::uint64_t number) const;
+
+    // The number of the oldest commit in the history; 0 when there are none.
+    [[nodiscard]] std::uint64_t oldest_recorded() const;
+
+    // What a recorded commit changed.
+    [[nodiscard]] std::vector<RecordedChange> changes_of(std::uint64_t number) const;
+
+    // Hands out what was changed after a commit, the last change first.
+    void visit_back_to(std::uint64_t number,
+                       const std::function<void(RecordedChange &&)> &take) const;
+
+    // The commit that is going to be undone, if the last one is.
+    [[nodiscard]] const std::optional<Wait> &wait() const noexcept;
+
+    // Ends the wait: the commits stay.
+    void confirm();
+
+    // Records why the waiting commits could not be undone.
+    void note_undo_refusal(const std::string &why);
 
   private:
     struct Parts;

@@ -11,6 +11,7 @@ using commit_test::config_of;
 using commit_test::tree_of;
 using ovhost::Candidate;
 using ovhost::Edit;
+using ovhost::Tree;
 using testing::ElementsAre;
 using testing::IsEmpty;
 
@@ -139,6 +140,27 @@ TEST(CandidateTest, DeletionOfWhatAnotherCommitHasDeletedIsNoChange)
     Candidate candidate(tree_of({{"/a", "1"}, {"/b", "1"}}));
     ASSERT_EQ(candidate.erase("/a"), std::nullopt);
     EXPECT_THAT(candidate.pending(tree_of({{"/b", "1"}})), IsEmpty());
+}
+
+TEST(CandidateTest, ReplaceLeadsToAnotherConfiguration)
+{
+    const Tree running = tree_of({{"/a", "1"}, {"/b", "1"}});
+    Candidate candidate(running);
+    ASSERT_EQ(candidate.set("/c", bt_string, "dropped"), std::nullopt);
+    candidate.replace(tree_of({{"/a", "2"}}));
+    EXPECT_EQ(config_of(candidate.tree()), (Config{{"/a", "2"}}));
+    EXPECT_EQ(config_of(candidate.over(running)), (Config{{"/a", "2"}}));
+}
+
+TEST(CandidateTest, RebaseKeepsTheEditsOverAnotherCommit)
+{
+    Candidate candidate(tree_of({{"/a", "1"}, {"/b", "1"}, {"/c", "1"}}));
+    ASSERT_EQ(candidate.set("/a", bt_string, "mine"), std::nullopt);
+    ASSERT_EQ(candidate.erase("/b"), std::nullopt);
+    const Tree running = tree_of({{"/a", "2"}, {"/b", "2"}, {"/c", "2"}});
+    candidate.rebase(running);
+    EXPECT_EQ(config_of(candidate.tree()), (Config{{"/a", "mine"}, {"/c", "2"}}));
+    EXPECT_EQ(candidate.pending(running).size(), 2U);
 }
 
 } // namespace

@@ -37,7 +37,7 @@ TEST(CommitStoreTest, StoreHoldsAcrossTheAdapterWhatWasCommitted)
     {
         ovhost::Store store = ovhost::Store::open(directory.path());
         ovhost::StoreAdapter adapter(store);
-        EXPECT_EQ(adapter.commit(ovhost::stored_changes(ovhost::diff({}, configured))), 1U);
+        EXPECT_EQ(adapter.commit(ovhost::stored_changes(ovhost::diff({}, configured)), {}), 1U);
     }
     ovhost::Store store = ovhost::Store::open(directory.path());
     const ovhost::Tree loaded = ovhost::load_tree(ovhost::StoreAdapter(store));

@@ -18,6 +18,7 @@ using commit_test::ScriptedModule;
 using commit_test::write;
 using ovhost::Candidate;
 using ovhost::CheckReport;
+using ovhost::CommitNote;
 using ovhost::CommitOutcome;
 using ovhost::CommitReport;
 using ovhost::Phase;
@@ -54,7 +55,7 @@ TEST(CommitEngineTest, PhasesComeInOrder)
     };
     Candidate candidate = bench.candidate({{"/a", "1"}, {"/b/c", "2"}, {"/b/c/d", "3"}});
 
-    const CommitReport report = bench.engine.commit(candidate, "");
+    const CommitReport report = bench.engine.commit(candidate, {});
 
     EXPECT_EQ(report.outcome, CommitOutcome::committed);
     EXPECT_TRUE(report.accepted());
@@ -115,7 +116,7 @@ TEST(CommitEngineTest, ModuleWithoutAMatchingChangeIsNotCalled)
     Bench bench({&module});
     module.calls = &calls;
     Candidate candidate = bench.candidate({{"/x", "1"}, {"/x/y/z", "2"}, {"/z", "3"}});
-    EXPECT_EQ(bench.engine.commit(candidate, "").outcome, CommitOutcome::committed);
+    EXPECT_EQ(bench.engine.commit(candidate, {}).outcome, CommitOutcome::committed);
     EXPECT_THAT(calls, IsEmpty());
 }
 
@@ -136,7 +137,7 @@ TEST(CommitEngineTest, ModulesSeeBothDatabasesAndAllChanges)
         seen.push_back(testing::PrintToString(described(changes)));
     };
     Candidate candidate = bench.candidate({{"/a", "new"}, {"/gone", std::nullopt}});
-    EXPECT_EQ(bench.engine.commit(candidate, "").outcome, CommitOutcome::committed);
+    EXPECT_EQ(bench.engine.commit(candidate, {}).outcome, CommitOutcome::committed);
     const std::string changes = "{ \"modify /a\", \"delete /gone\" }";
     EXPECT_THAT(seen, ElementsAre("old>new", changes, "old>new", changes, changes));
 }
@@ -155,7 +156,7 @@ TEST(CommitEngineTest, RefusalLeavesEverythingAsItWas)
     };
     Candidate candidate = bench.candidate({{"/a", "2"}, {"/b", "x"}});
 
-    const CommitReport report = bench.engine.commit(candidate, "");
+    const CommitReport report = bench.engine.commit(candidate, {});
 
     EXPECT_EQ(report.outcome, CommitOutcome::refused);
     EXPECT_FALSE(report.accepted());
@@ -170,7 +171,7 @@ TEST(CommitEngineTest, RefusalLeavesEverythingAsItWas)
 
     // The candidate can be mended and committed: nothing of the refused round sticks to it.
     ASSERT_EQ(candidate.set("/a", bt_string, "1"), std::nullopt);
-    EXPECT_EQ(bench.engine.commit(candidate, "").outcome, CommitOutcome::committed);
+    EXPECT_EQ(bench.engine.commit(candidate, {}).outcome, CommitOutcome::committed);
     EXPECT_EQ(bench.running(), (Config{{"/a", "1"}, {"/b", "x"}}));
 }
 
@@ -189,7 +190,7 @@ TEST(CommitEngineTest, AllRefusalsReachTheClientEachWithItsNode)
         return md_commit_set_return_status_msg_fmt(info->commit, 7, "%s: %d", "second", 2);
     };
     Candidate candidate = bench.candidate({{"/a", "1"}, {"/b", "2"}});
-    EXPECT_THAT(bench.engine.commit(candidate, "").refusals,
+    EXPECT_THAT(bench.engine.commit(candidate, {}).refusals,
                 ElementsAre(Refusal{"/a", "first", 1, "first: /a"},
                             Refusal{"/b", "first", 1, "first: /b"},
                             Refusal{"", "first", 1, "too much at once"},
@@ -205,7 +206,7 @@ TEST(CommitEngineTest, LaterMessageOfOneCallReplacesTheEarlier)
     };
     module.on_commit = [](md_dbinfo *, const mdb_db_change_array *) { return 0; };
     Candidate candidate = bench.candidate({{"/a", "1"}});
-    EXPECT_THAT(bench.engine.commit(candidate, "").refusals,
+    EXPECT_THAT(bench.engine.commit(candidate, {}).refusals,
                 ElementsAre(Refusal{"/a", "wordy", 1, "last words"}));
 }
 
@@ -219,7 +220,7 @@ TEST(CommitEngineTest, MessageCountsWhateverTheCheckReturns)
             return code;
         };
         Candidate candidate = bench.candidate({{"/a", "1"}});
-        EXPECT_THAT(bench.engine.commit(candidate, "").refusals,
+        EXPECT_THAT(bench.engine.commit(candidate, {}).refusals,
                     ElementsAre(Refusal{"/a", "maps", 1, "in use"}));
     }
 }
@@ -232,7 +233,7 @@ TEST(CommitEngineTest, RefusalWithTheCodeForSuccessIsARefusal)
         return md_commit_set_return_status_msg(info->commit, 0, "no");
     };
     Candidate candidate = bench.candidate({{"/a", "1"}});
-    EXPECT_THAT(bench.engine.commit(candidate, "").refusals,
+    EXPECT_THAT(bench.engine.commit(candidate, {}).refusals,
                 ElementsAre(Refusal{"/a", "odd", 14000, "no"}));
 }
 
@@ -245,7 +246,7 @@ TEST(CommitEngineTest, ExceptionReplacesTheMessageOfItsCall)
         throw std::runtime_error("last words");
     };
     Candidate candidate = bench.candidate({{"/a", "1"}});
-    EXPECT_THAT(bench.engine.commit(candidate, "").refusals,
+    EXPECT_THAT(bench.engine.commit(candidate, {}).refusals,
                 ElementsAre(Refusal{"/a", "rash", 14000, "last words"}));
 }
 
@@ -268,7 +269,7 @@ TEST_P(SilentFailureTest, ClientGetsAMessageAllTheSame)
     module.on_commit = [&](md_dbinfo *, const mdb_db_change_array *) { return failure.code; };
     Candidate candidate = bench.candidate({{"/a/b", "1"}});
     LogCapture log;
-    const CommitReport report = bench.engine.commit(candidate, "");
+    const CommitReport report = bench.engine.commit(candidate, {});
     EXPECT_THAT(report.refusals,
                 ElementsAre(Refusal{"/a/b", "limits", failure.code, failure.of_node},
                             Refusal{"", "limits", failure.code, failure.of_commit}));
@@ -298,7 +299,7 @@ TEST(CommitEngineTest, ExceptionInACheckRefusesWithItsWords)
     };
     module.on_commit = [](md_dbinfo *, const mdb_db_change_array *) -> int { throw 42; };
     Candidate candidate = bench.candidate({{"/a", "1"}});
-    const CommitReport report = bench.engine.commit(candidate, "");
+    const CommitReport report = bench.engine.commit(candidate, {});
     EXPECT_THAT(report.refusals,
                 ElementsAre(Refusal{"/a", "rash", 14000, "cannot tell"},
                             Refusal{"", "rash", 14000,
@@ -318,7 +319,7 @@ TEST(CommitEngineTest, FailingStoreLeavesEverythingAsItWas)
     bench.store.failure = "config.db: the disk is full: make room and commit again";
     module.calls = &calls;
 
-    const CommitReport report = bench.engine.commit(candidate, "");
+    const CommitReport report = bench.engine.commit(candidate, {});
 
     EXPECT_EQ(report.outcome, CommitOutcome::not_stored);
     EXPECT_FALSE(report.accepted());
@@ -332,7 +333,7 @@ TEST(CommitEngineTest, FailingStoreLeavesEverythingAsItWas)
     EXPECT_EQ(config_of(candidate.tree()), (Config{{"/a", "2"}}));
 
     bench.store.failure.reset();
-    EXPECT_EQ(bench.engine.commit(candidate, "").outcome, CommitOutcome::committed);
+    EXPECT_EQ(bench.engine.commit(candidate, {}).outcome, CommitOutcome::committed);
     EXPECT_EQ(bench.running(), (Config{{"/a", "2"}, {"/w", "1"}}));
     EXPECT_EQ(bench.store.config(), bench.running());
 }
@@ -353,7 +354,7 @@ TEST(CommitEngineTest, CommitStandsWhenApplyFails)
     Candidate candidate = bench.candidate({{"/a", "1"}});
     LogCapture log;
 
-    const CommitReport report = bench.engine.commit(candidate, "");
+    const CommitReport report = bench.engine.commit(candidate, {});
 
     const std::string failed = "module failing failed to apply the commit with code 14014 (generic "
                                "IO error); the commit stands";
@@ -384,7 +385,7 @@ TEST(CommitEngineTest, ExceptionInNotifyIsAWarning)
     module.on_notify = [](const mdb_db_change_array *) { throw 42; };
     Candidate candidate = bench.candidate({{"/a", "1"}});
     LogCapture log;
-    const CommitReport report = bench.engine.commit(candidate, "");
+    const CommitReport report = bench.engine.commit(candidate, {});
     const std::string text =
         "module peers threw an exception in notify (no reason given); the commit stands";
     EXPECT_EQ(report.outcome, CommitOutcome::committed);
@@ -400,7 +401,7 @@ TEST(CommitEngineTest, CommitWithoutChangesIsToldAndNotStored)
     bench.start_with({{"/a", "1"}});
     module.calls = bench.store.calls = &calls;
     Candidate candidate = bench.candidate({{"/a", "1"}});
-    const CommitReport report = bench.engine.commit(candidate, "");
+    const CommitReport report = bench.engine.commit(candidate, {});
     EXPECT_EQ(report.outcome, CommitOutcome::unchanged);
     EXPECT_TRUE(report.accepted());
     EXPECT_THAT(report.changes, IsEmpty());
@@ -414,7 +415,7 @@ TEST(CommitEngineTest, CommitWhoseChangesAllAreTakenBackIsUnchanged)
     bench.start_with({{"/a", "1"}});
     module.on_change = [](md_dbinfo *info, mdb_db_change *) { return write(info, "/a", "1"); };
     Candidate candidate = bench.candidate({{"/a", "2"}});
-    EXPECT_EQ(bench.engine.commit(candidate, "").outcome, CommitOutcome::unchanged);
+    EXPECT_EQ(bench.engine.commit(candidate, {}).outcome, CommitOutcome::unchanged);
     EXPECT_EQ(bench.store.attempts, 0U);
     EXPECT_EQ(config_of(candidate.tree()), (Config{{"/a", "1"}}));
 }
@@ -459,12 +460,12 @@ TEST(CommitEngineTest, CandidateHasTheAmendmentsAfterTheCommit)
     Bench bench({&module});
     module.on_change = [](md_dbinfo *info, mdb_db_change *) { return write(info, "/b", "1"); };
     Candidate candidate = bench.candidate({{"/a", "2"}});
-    const CommitReport report = bench.engine.commit(candidate, "");
+    const CommitReport report = bench.engine.commit(candidate, {});
     EXPECT_EQ(report.changes.size(), 2U);
     EXPECT_EQ(config_of(candidate.tree()), (Config{{"/a", "2"}, {"/b", "1"}}));
     EXPECT_EQ(bench.running(), (Config{{"/a", "2"}, {"/b", "1"}}));
     EXPECT_EQ(bench.store.config(), bench.running());
-    EXPECT_EQ(bench.engine.commit(candidate, "").outcome, CommitOutcome::unchanged);
+    EXPECT_EQ(bench.engine.commit(candidate, {}).outcome, CommitOutcome::unchanged);
 }
 
 TEST(CommitEngineTest, EditsOfTwoCandidatesAreBothKept)
@@ -473,8 +474,8 @@ TEST(CommitEngineTest, EditsOfTwoCandidatesAreBothKept)
     bench.start_with({{"/a", "1"}, {"/b", "1"}});
     Candidate mine = bench.candidate({{"/a", "mine"}});
     Candidate theirs = bench.candidate({{"/b", "theirs"}});
-    EXPECT_EQ(bench.engine.commit(theirs, "").outcome, CommitOutcome::committed);
-    EXPECT_EQ(bench.engine.commit(mine, "").outcome, CommitOutcome::committed);
+    EXPECT_EQ(bench.engine.commit(theirs, {}).outcome, CommitOutcome::committed);
+    EXPECT_EQ(bench.engine.commit(mine, {}).outcome, CommitOutcome::committed);
     EXPECT_EQ(bench.running(), (Config{{"/a", "mine"}, {"/b", "theirs"}}));
 }
 
@@ -496,12 +497,12 @@ TEST(CommitEngineTest, InitialCommitGoesTheSameRoad)
     Bench bench({&module});
     module.calls = bench.store.calls = &calls;
     Candidate candidate = bench.candidate({{"/a", "1"}});
-    const CommitReport report = bench.engine.initial(candidate);
+    const CommitReport report = bench.engine.initial(candidate, {});
     EXPECT_EQ(report.outcome, CommitOutcome::committed);
     EXPECT_THAT(calls, ElementsAre("any check add /a", "any check commit", "store", "any apply",
                                    "any notify"));
     EXPECT_EQ(bench.store.config(), (Config{{"/a", "1"}}));
-    EXPECT_THROW((void)bench.engine.initial(candidate), std::logic_error);
+    EXPECT_THROW((void)bench.engine.initial(candidate, {}), std::logic_error);
 }
 
 TEST(CommitEngineTest, CommitIsLoggedWithItsComment)
@@ -509,13 +510,31 @@ TEST(CommitEngineTest, CommitIsLoggedWithItsComment)
     Bench bench;
     Candidate candidate = bench.candidate({{"/a", "1"}});
     LogCapture log;
-    (void)bench.engine.commit(candidate, "");
+    (void)bench.engine.commit(candidate, {});
     ASSERT_EQ(candidate.set("/a", bt_string, "2"), std::nullopt);
     ASSERT_EQ(candidate.set("/b", bt_string, "2"), std::nullopt);
-    (void)bench.engine.commit(candidate, "from the lab");
+    CommitNote note;
+    note.comment = "from the lab";
+    (void)bench.engine.commit(candidate, note);
     EXPECT_THAT(log.texts(ov_log_notice),
                 ElementsAre("commit 1 is in force: 1 change",
                             "commit 2 is in force: 2 changes (from the lab)"));
+}
+
+TEST(CommitEngineTest, NoteGoesToTheStore)
+{
+    Bench bench;
+    Candidate candidate = bench.candidate({{"/a", "1"}});
+    CommitNote note;
+    note.time = 1700000000;
+    note.uid = 7;
+    note.author = "anna";
+    note.confirm_within = 60;
+    (void)bench.engine.commit(candidate, note);
+    EXPECT_EQ(bench.store.note.time, 1700000000);
+    EXPECT_EQ(bench.store.note.uid, 7U);
+    EXPECT_EQ(bench.store.note.author, "anna");
+    EXPECT_EQ(bench.store.note.confirm_within, 60U);
 }
 
 TEST(CommitEngineTest, ModuleCannotCommitInsideACommit)
@@ -525,15 +544,15 @@ TEST(CommitEngineTest, ModuleCannotCommitInsideACommit)
     Candidate candidate = bench.candidate({{"/a", "1"}});
     module.on_change = [&](md_dbinfo *, mdb_db_change *) {
         Candidate other = bench.candidate({{"/b", "1"}});
-        (void)bench.engine.commit(other, "");
+        (void)bench.engine.commit(other, {});
         return 0;
     };
-    EXPECT_THAT(bench.engine.commit(candidate, "").refusals,
+    EXPECT_THAT(bench.engine.commit(candidate, {}).refusals,
                 ElementsAre(Refusal{"/a", "nested", 14000,
                                     "a commit is running: a module cannot start another one"}));
     EXPECT_EQ(bench.running(), Config());
     module.on_change = nullptr;
-    EXPECT_EQ(bench.engine.commit(candidate, "").outcome, CommitOutcome::committed);
+    EXPECT_EQ(bench.engine.commit(candidate, {}).outcome, CommitOutcome::committed);
 }
 
 std::string registration_fault(Bench &bench, ScriptedModule &module)
@@ -568,7 +587,7 @@ TEST(ModuleTest, DefaultsAcceptEverything)
     Plain module;
     Bench bench({&module});
     Candidate candidate = bench.candidate({{"/a", "1"}});
-    const CommitReport report = bench.engine.commit(candidate, "");
+    const CommitReport report = bench.engine.commit(candidate, {});
     EXPECT_EQ(report.outcome, CommitOutcome::committed);
     EXPECT_THAT(report.warnings, IsEmpty());
 }

@@ -60,12 +60,13 @@ class FailingStore : public ovhost::CommitStore
         inner_.load(take);
     }
 
-    std::uint64_t commit(std::span<const ovhost::StoredChange> changes) override
+    std::uint64_t commit(std::span<const ovhost::StoredChange> changes,
+                         const ovhost::CommitNote &note) override
     {
         if (fails) {
             throw ovhost::StoreError("out of space");
         }
-        return inner_.commit(changes);
+        return inner_.commit(changes, note);
     }
 
     bool fails = false;
@@ -229,7 +230,7 @@ class RandomCommits
             dry_run();
         }
         const CommitOutcome expected = expected_outcome();
-        const CommitReport report = engine_.commit(candidate_, "");
+        const CommitReport report = engine_.commit(candidate_, {});
         ++outcomes[expected];
         ASSERT_EQ(report.outcome, expected) << "mischief " << static_cast<int>(mischief_.mischief);
         compare(report);
@@ -399,9 +400,10 @@ class ReopenedStore : public ovhost::CommitStore
         opened().load(take);
     }
 
-    std::uint64_t commit(std::span<const ovhost::StoredChange> changes) override
+    std::uint64_t commit(std::span<const ovhost::StoredChange> changes,
+                         const ovhost::CommitNote &note) override
     {
-        return opened().commit(changes);
+        return opened().commit(changes, note);
     }
 
   private:

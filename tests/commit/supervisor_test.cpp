@@ -61,7 +61,7 @@ class DutyTest : public testing::Test
         bench.engine.add_module(module);
         bench.start_with({{"/a", "old"}});
         Candidate candidate = bench.candidate({{"/a", "new"}});
-        return bench.engine.commit(candidate, "");
+        return bench.engine.commit(candidate, {});
     }
 
     void expect_breach(const CommitReport &report, Phase phase, const std::string &text)
@@ -207,7 +207,7 @@ TEST_F(DutyTest, CheckCannotSpoilTheHandlesOfTheNext)
     bench.engine.add_module(module);
     bench.engine.add_module(next);
     Candidate candidate = bench.candidate({{"/a", "new"}});
-    EXPECT_EQ(bench.engine.commit(candidate, "").outcome, CommitOutcome::committed);
+    EXPECT_EQ(bench.engine.commit(candidate, {}).outcome, CommitOutcome::committed);
     EXPECT_EQ(seen, "new");
 }
 

@@ -129,7 +129,8 @@ void MemoryStore::load(const std::function<void(ovhost::StoredNode &&)> &take) c
     }
 }
 
-std::uint64_t MemoryStore::commit(std::span<const ovhost::StoredChange> changes)
+std::uint64_t MemoryStore::commit(std::span<const ovhost::StoredChange> changes,
+                                  const ovhost::CommitNote &told)
 {
     ++attempts;
     if (calls != nullptr) {
@@ -145,6 +146,7 @@ std::uint64_t MemoryStore::commit(std::span<const ovhost::StoredChange> changes)
             nodes.erase(change.name);
         }
     }
+    note = told;
     return ++commits;
 }
 

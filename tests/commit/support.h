@@ -75,11 +75,14 @@ class MemoryStore : public ovhost::CommitStore
 {
   public:
     void load(const std::function<void(ovhost::StoredNode &&)> &take) const override;
-    std::uint64_t commit(std::span<const ovhost::StoredChange> changes) override;
+    std::uint64_t commit(std::span<const ovhost::StoredChange> changes,
+                         const ovhost::CommitNote &note) override;
 
     [[nodiscard]] Config config() const;
 
     std::map<std::string, ovhost::StoredValue> nodes;
+    /// Of the last commit.
+    ovhost::CommitNote note;
     /// Thrown by every commit while it is set.
     std::optional<std::string> failure;
     unsigned commits = 0;

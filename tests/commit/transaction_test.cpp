@@ -111,7 +111,7 @@ TEST(TransactionTest, AmendmentMayBeRefusedByAnotherModule)
         return md_commit_set_return_status_msg(info->commit, 1, "no /b");
     };
     Candidate candidate = bench.candidate({{"/a", "1"}});
-    EXPECT_THAT(bench.engine.commit(candidate, "").refusals,
+    EXPECT_THAT(bench.engine.commit(candidate, {}).refusals,
                 ElementsAre(Refusal{"/b", "limits", 1, "no /b"}));
     EXPECT_EQ(bench.running(), Config());
 }
@@ -141,7 +141,7 @@ TEST(TransactionTest, DeletionsOfModulesAreListedAndChecked)
         return commit_test::remove(info, "/b");
     };
     Candidate candidate = bench.candidate({{"/a", std::nullopt}});
-    EXPECT_EQ(bench.engine.commit(candidate, "").outcome, CommitOutcome::committed);
+    EXPECT_EQ(bench.engine.commit(candidate, {}).outcome, CommitOutcome::committed);
     EXPECT_THAT(calls, ElementsAre("watcher check delete /b", "watcher check delete /b/c",
                                    "watcher check commit", "watcher apply", "watcher notify"));
     EXPECT_EQ(bench.running(), Config());
@@ -164,7 +164,7 @@ TEST(TransactionTest, WithdrawnChangeIsReasonToCheckTheCommitAgain)
         return commit_test::remove(info, "/b");
     };
     Candidate candidate = bench.candidate({{"/a", "1"}, {"/b", "1"}});
-    EXPECT_EQ(bench.engine.commit(candidate, "").outcome, CommitOutcome::committed);
+    EXPECT_EQ(bench.engine.commit(candidate, {}).outcome, CommitOutcome::committed);
     EXPECT_THAT(
         calls, ElementsAre("counter check add /b", "counter check commit", "counter check commit"));
     EXPECT_THAT(lists, ElementsAre(ElementsAre("add /a", "add /b"), ElementsAre("add /a")));
@@ -192,7 +192,7 @@ TEST(TransactionTest, ModulesMayAmendInSevenRounds)
         return ++rounds < 8 ? lengthen(info, "/a", "/a") : 0;
     };
     Candidate candidate = bench.candidate({{"/a", "x"}});
-    EXPECT_EQ(bench.engine.commit(candidate, "").outcome, CommitOutcome::committed);
+    EXPECT_EQ(bench.engine.commit(candidate, {}).outcome, CommitOutcome::committed);
     EXPECT_EQ(rounds, 8U);
     EXPECT_EQ(bench.running(), (Config{{"/a", "xxxxxxxx"}}));
 }
@@ -207,7 +207,7 @@ TEST(TransactionTest, ModuleThatKeepsAmendingIsNamed)
         return lengthen(info, "/a", "/a");
     };
     Candidate candidate = bench.candidate({{"/a", "x"}});
-    EXPECT_THAT(bench.engine.commit(candidate, "").refusals,
+    EXPECT_THAT(bench.engine.commit(candidate, {}).refusals,
                 ElementsAre(Refusal{"/a", "chain", 14000,
                                     "module chain keeps amending the configuration: /a still "
                                     "changed in check round 8, the last"}));
@@ -230,7 +230,7 @@ TEST(TransactionTest, AllModulesThatKeepAmendingAreNamed)
     };
     // Both ends of the chain are in motion at once: /start makes /l, and /r is there already.
     Candidate candidate = bench.candidate({{"/start", "1"}, {"/l", "1"}, {"/r", "1"}});
-    EXPECT_THAT(bench.engine.commit(candidate, "").refusals,
+    EXPECT_THAT(bench.engine.commit(candidate, {}).refusals,
                 ElementsAre(Refusal{"/l", "left, right", 14000,
                                     "modules left, right keep amending the configuration: /l still "
                                     "changed in check round 8, the last"}));
@@ -246,7 +246,7 @@ TEST(TransactionTest, LastWithdrawnChangeNamesTheNode)
         return ++rounds % 2 == 1 ? write(info, "/b", "1") : commit_test::remove(info, "/b");
     };
     Candidate candidate = bench.candidate({{"/a", "1"}});
-    EXPECT_THAT(bench.engine.commit(candidate, "").refusals,
+    EXPECT_THAT(bench.engine.commit(candidate, {}).refusals,
                 ElementsAre(Refusal{"/b", "flicker", 14000,
                                     "module flicker keeps amending the configuration: /b still "
                                     "changed in check round 8, the last"}));
@@ -263,7 +263,7 @@ TEST(TransactionTest, AmendmentThatDoesNotFitItsTypeIsRefused)
         return 0;
     };
     Candidate candidate = bench.candidate({{"/a", "1"}});
-    EXPECT_THAT(bench.engine.commit(candidate, "").refusals,
+    EXPECT_THAT(bench.engine.commit(candidate, {}).refusals,
                 ElementsAre(Refusal{"/b", "sloppy", 14020,
                                     "/b: \"300\" is not a uint8: must be a decimal number from 0 "
                                     "to 255"}));
@@ -287,7 +287,7 @@ TEST(TransactionTest, NoNotifyMarkOfACheckReachesNotify)
         }
     };
     Candidate candidate = bench.candidate({{"/a", "1"}});
-    EXPECT_EQ(bench.engine.commit(candidate, "").outcome, CommitOutcome::committed);
+    EXPECT_EQ(bench.engine.commit(candidate, {}).outcome, CommitOutcome::committed);
     EXPECT_THAT(marks, ElementsAre(true, false));
 }
 

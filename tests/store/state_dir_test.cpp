@@ -47,11 +47,38 @@ TEST(StateDir, IsMadeForItsUserOnly)
     EXPECT_EQ(mode_of(scratch / "state/lock"), 0600U);
 }
 
-TEST(StateDir, AnExistingOneKeepsItsMode)
+TEST(StateDir, AnExistingOneIsClosedToOtherUsers)
+{
+    for (const char *file : {"", "lock", "config.db", "config.db-wal"}) {
+        const ScratchDir scratch;
+        if (*file != '\0')
+            ovtest::write_file(scratch / file, "");
+        ASSERT_EQ(::chmod(scratch.path().c_str(), 0777), 0);
+        const StateDir dir(scratch.path());
+        EXPECT_EQ(mode_of(scratch.path()), 0700U) << file;
+    }
+}
+
+TEST(StateDir, OneThatHoldsOtherFilesTooKeepsItsMode)
 {
     const ScratchDir scratch;
+    ovtest::write_file(scratch / "other", "");
     const StateDir dir(scratch.path());
     EXPECT_EQ(mode_of(scratch.path()), 0755U);
+}
+
+TEST(StateDir, OneThatHoldsOtherFilesTooAndIsOpenToOtherUsersIsRefused)
+{
+    const ScratchDir scratch;
+    ovtest::write_file(scratch / "other", "");
+    for (const mode_t mode : {0777U, 01777U, 0775U, 0757U}) {
+        ASSERT_EQ(::chmod(scratch.path().c_str(), mode), 0);
+        EXPECT_EQ(lock_refusal(scratch.path()),
+                  "other users can write the state directory " + scratch.path().string() +
+                      "; give it mode 0700, or choose another state directory");
+        EXPECT_EQ(mode_of(scratch.path()), mode);
+        EXPECT_FALSE(std::filesystem::exists(scratch / "lock"));
+    }
 }
 
 TEST(StateDir, ASecondHolderIsRefusedWithTheNumberOfTheFirst)

@@ -202,10 +202,10 @@ TEST_F(StoreDamage, StatisticsOfTheTablesDoNoHarm)
 TEST_F(StoreDamage, ANewerVersion)
 {
     make_store();
-    run_sql(file_, "PRAGMA user_version = 2; CREATE TABLE later (a)");
+    run_sql(file_, "PRAGMA user_version = 3; CREATE TABLE later (a)");
     EXPECT_EQ(refused(), "the configuration database " + file_.string() +
                              " was written by a newer version of this program (its schema is"
-                             " version 2, this program knows up to 1); the file was left as it"
+                             " version 3, this program knows up to 2); the file was left as it"
                              " was: run the newer version");
 }
 
@@ -221,6 +221,40 @@ TEST_F(StoreDamage, AMissingCommitNumber)
     make_store();
     run_sql(file_, "DELETE FROM meta");
     EXPECT_EQ(refused(), damaged("its commit number is missing"));
+}
+
+TEST_F(StoreDamage, AHistoryWithAGap)
+{
+    for (const char *sql :
+         {"DELETE FROM commits WHERE number = 2", "DELETE FROM commits WHERE number = 3",
+          "UPDATE meta SET commits = 4"}) {
+        {
+            Store store = Store::open(scratch_.path());
+            for (int i = 0; i < 3; ++i)
+                store.commit({});
+        }
+        run_sql(file_, sql);
+        EXPECT_EQ(refused(), damaged("its history does not lead to its last commit")) << sql;
+        fs::remove(file_);
+    }
+}
+
+TEST_F(StoreDamage, AWaitingCommitThatCannotBeUndone)
+{
+    for (const char *sql : {"DELETE FROM commits WHERE number <= 2", "UPDATE wait SET number = 2",
+                            "DELETE FROM commits"}) {
+        {
+            Store store = Store::open(scratch_.path());
+            store.commit({});
+            ovhost::CommitNote note;
+            note.confirm_within = 60;
+            store.commit({}, note);
+            store.commit({}, note);
+        }
+        run_sql(file_, sql);
+        EXPECT_EQ(refused(), damaged("its history lacks what a waiting commit needs")) << sql;
+        fs::remove(file_);
+    }
 }
 
 TEST_F(StoreDamage, AValueOutOfItsRange)
@@ -259,7 +293,11 @@ TEST_F(StoreDamage, AFileThisUserMayNotReadOrWrite)
     for (const mode_t mode : {0000U, 0444U}) {
         fs::remove(scratch_ / "lock");
         ASSERT_EQ(::chmod(file_.c_str(), mode), 0);
-        ASSERT_EQ(::chmod(scratch_.path().c_str(), 0777), 0);
+        if (::geteuid() == 0) {
+            ASSERT_EQ(::chown(scratch_.path().c_str(), ovtest::kUnprivilegedUser,
+                              ovtest::kUnprivilegedUser),
+                      0);
+        }
         EXPECT_EQ(ovtest::in_child([&] {
                       ovtest::become_unprivileged();
                       return refusal(scratch_.path());

@@ -54,6 +54,26 @@ TEST(Store, ItsFilesAreForItsUserOnly)
     EXPECT_EQ(files, 3U); // config.db, config.db-wal, lock
 }
 
+TEST(Store, FilesThatWerePutBackOpenAreClosed)
+{
+    const ScratchDir scratch;
+    {
+        Store store = Store::open(scratch.path());
+        commit(store, {put("/a", "1")});
+    }
+    ovtest::write_file(scratch / "config.db-wal", "");
+    for (const char *file : {"config.db", "config.db-wal"})
+        ASSERT_EQ(::chmod((scratch / file).c_str(), 0644), 0);
+    Store store = Store::open(scratch.path());
+    commit(store, {put("/a", "2")});
+    for (const char *file : {"config.db", "config.db-wal"}) {
+        struct stat about {
+        };
+        ASSERT_EQ(::stat((scratch / file).c_str(), &about), 0);
+        EXPECT_EQ(about.st_mode & 07777U, 0600U) << file;
+    }
+}
+
 TEST(Store, AnEmptyOneIsStillEmptyWhenOpenedAgain)
 {
     const ScratchDir scratch;
