@@ -113,7 +113,9 @@ TEST(PastPropertyTest, EveryConfigurationOfARandomHistoryComesBack)
     const TemporaryDirectory directory;
     Store store = Store::open(directory.path());
     std::mt19937 random(5);
-    const auto below = [&random](unsigned bound) { return random() % bound; };
+    const auto below = [&random](unsigned bound) {
+        return static_cast<unsigned>(random() % bound);
+    };
     std::vector<Config> states(1);
     Tree running;
     for (int round = 0; round < 60; ++round) {
