@@ -9,10 +9,10 @@
 namespace ovmd
 {
 
-constexpr char acl_root[] = "/ov/tunneld/acl/config";
+inline constexpr char acl_root[] = "/ov/tunneld/acl/config";
 
 // The entry that every map has: it is neither counted nor does it refer to an ACL.
-constexpr char default_priority[] = "65535";
+inline constexpr char default_priority[] = "65535";
 
 struct map_type {
     int mtype;
@@ -38,7 +38,7 @@ struct map_type {
     bool has_legacy_form; // entries with one node for each field are upgraded
 };
 
-constexpr int no_map_limit = -1;
+inline constexpr int no_map_limit = -1;
 
 // The kinds whose maps have no level of their own: MAP/prio/PRIORITY below the root.
 #define OVMD_REGULAR_MAP_TYPE(mtype, key, user_name, root, max_entries, counts_entries)            \
@@ -52,7 +52,7 @@ constexpr int no_map_limit = -1;
 // one. Its limit is the NAT maps'.
 #define OVMD_SEC_MAP "/ov/tunneld/sec_map/config/map"
 
-constexpr map_type map_types[] = {
+inline constexpr map_type map_types[] = {
     OVMD_REGULAR_MAP_TYPE(MAP_TYPE_R, "rmap", "route-map", "/ov/tunneld/route_map/config/map",
                           get_max_rmap_entries, true),
     OVMD_REGULAR_MAP_TYPE(MAP_TYPE_O, "omap", "opt-map", "/ov/tunneld/opt_map/config/map",
