@@ -8,8 +8,23 @@
 #include <gmock/gmock.h>
 #include <gtest/gtest.h>
 
+#include <string>
+#include <vector>
+
 namespace ovtest
 {
+
+// A line of the log by its place, counted from 0, and the last one; empty where there is none.
+inline std::string log_line(std::size_t place)
+{
+    const std::vector<std::string> lines = log_lines();
+    return place < lines.size() ? lines[place] : "";
+}
+inline std::string last_log_line()
+{
+    const std::vector<std::string> lines = log_lines();
+    return lines.empty() ? "" : lines.back();
+}
 
 class LibraryTest : public testing::Test
 {

@@ -159,8 +159,7 @@ TEST_P(AclGuardOfEveryKind, AnotherSpellingIsAnotherAcl)
     for (const char *value : {"A1", "a", "a11", "a1 ", ""}) {
         commit_.set_new(kind.acl_node("m1", "10"), value);
         EXPECT_EQ(remove_acl(kind), 0);
-        EXPECT_EQ(log_lines().back(),
-                  gated_line(6, "Ref <m1/10>, <" + std::string(value) + "/a1>"));
+        EXPECT_EQ(last_log_line(), gated_line(6, "Ref <m1/10>, <" + std::string(value) + "/a1>"));
     }
     EXPECT_THAT(refused(), IsEmpty());
 }
@@ -172,7 +171,7 @@ TEST_P(AclGuardOfEveryKind, ReferencesAreThoseOfTheDatabaseBefore)
     commit_.set_new(kind.acl_node("m1", "10"), "a1");
     EXPECT_EQ(remove_acl(kind), 0);
     EXPECT_THAT(refused(), IsEmpty());
-    EXPECT_EQ(log_lines().back(), use_line(kind, 0));
+    EXPECT_EQ(last_log_line(), use_line(kind, 0));
 }
 
 TEST_P(AclGuardOfEveryKind, EntriesAreThoseOfTheProposedDatabase)
@@ -212,7 +211,7 @@ TEST_P(AclGuardOfEveryKind, EachKindOfMapIsAskedForItself)
     give_entry(GetParam(), "m1", "10", "a2");
     EXPECT_EQ(remove_acl(GetParam()), 0);
     EXPECT_THAT(refused(), IsEmpty());
-    EXPECT_EQ(log_lines().back(), use_line(GetParam(), 0));
+    EXPECT_EQ(last_log_line(), use_line(GetParam(), 0));
 }
 
 TEST_P(AclGuardOfEveryKind, OtherChangesAreNoneOfItsBusiness)
@@ -249,7 +248,7 @@ TEST_P(AclGuardOfEveryKind, ALongNameIsCut)
     EXPECT_EQ(refused().size(), 2U);
     EXPECT_EQ(remove_acl(kind, std::string(600, 'a')), 0);
     EXPECT_EQ(refused().size(), 3U);
-    EXPECT_EQ(log_lines().back(), gated_line(6, "Ref <m1/10>, <" + fits + '/' + fits + '>'));
+    EXPECT_EQ(last_log_line(), gated_line(6, "Ref <m1/10>, <" + fits + '/' + fits + '>'));
 }
 
 TEST_P(AclGuardOfEveryKind, LongNamesOfMapsAreKeptWhole)
@@ -259,7 +258,7 @@ TEST_P(AclGuardOfEveryKind, LongNamesOfMapsAreKeptWhole)
     give_entry(kind, map, "10");
     EXPECT_EQ(remove_acl(kind), 0);
     EXPECT_EQ(refused().size(), 1U);
-    EXPECT_EQ(log_lines()[2], path_line(kind.acl_node(map, "10")));
+    EXPECT_EQ(log_line(2), path_line(kind.acl_node(map, "10")));
 }
 
 // Names go into paths as they are: a slash makes two levels of one name, and the parts of a
@@ -289,7 +288,7 @@ TEST_P(AclGuardOfEveryKind, AMapWithASlashInItsNameIsLookedUpTwoLevelsDeep)
     commit_.set_new(kind.acl_node(written("m/n"), "10"), "a1");
     EXPECT_EQ(remove_acl(kind), 0);
     EXPECT_THAT(refused(), IsEmpty());
-    EXPECT_EQ(log_lines().back(), path_line(kind.acl_node("m/n", "10")));
+    EXPECT_EQ(last_log_line(), path_line(kind.acl_node("m/n", "10")));
 }
 
 TEST_P(AclGuardOfEveryKind, WithoutAListThereAreNoReferences)
@@ -308,11 +307,11 @@ TEST_P(AclGuardOfEveryKind, ARefusalThatCannotBeReportedIsAnError)
     give_entry(kind, "m1", "10");
     arm({.operation = Operation::md_commit_set_return_status_msg, .code = 14002});
     EXPECT_EQ(remove_acl(kind), 14002);
-    EXPECT_EQ(log_lines().back(), line_of("Error code 14002 (assertion failed) returned"));
+    EXPECT_EQ(last_log_line(), line_of("Error code 14002 (assertion failed) returned"));
     forget_calls();
     arm({.operation = Operation::md_commit_set_return_status_msg, .code = 14120});
     EXPECT_EQ(remove_acl(kind), 14120);
-    EXPECT_EQ(log_lines().back(), gated_line(6, "Ref <m1/10>, <a1/a1>"));
+    EXPECT_EQ(last_log_line(), gated_line(6, "Ref <m1/10>, <a1/a1>"));
 }
 
 TEST_P(AclGuardOfEveryKind, LinesAreWrittenFromTheirLevelsOn)
@@ -403,7 +402,7 @@ TEST_F(AclGuard, WithoutADatabaseTheHostsCodeIsPassedUp)
     EXPECT_EQ(remove_acl(route_map), 14001);
     commit_.dbinfo.olddb = nullptr;
     EXPECT_EQ(remove_acl(route_map), 14001);
-    EXPECT_EQ(log_lines().back(), line_of("Error code 14001 (unexpected NULL) returned"));
+    EXPECT_EQ(last_log_line(), line_of("Error code 14001 (unexpected NULL) returned"));
     EXPECT_THAT(refused(), IsEmpty());
 }
 

@@ -152,8 +152,8 @@ TEST_P(ReferencesOfEveryKind, OtherEntriesOfTheMapKeepTheirs)
     EXPECT_THAT(references(), ElementsAre(reference_node(kind, "m1", "20", "a1"),
                                           reference_node(kind, "m1", "10", "a2")));
     const std::string old_reference = kind.reference("a1", "m1", "10");
-    EXPECT_EQ(log_lines()[6], path_line(old_reference));
-    EXPECT_EQ(log_lines()[7], info("Removing " + old_reference));
+    EXPECT_EQ(log_line(6), path_line(old_reference));
+    EXPECT_EQ(log_line(7), info("Removing " + old_reference));
 }
 
 // The whole level of the map goes, with all that stands below it.
@@ -191,7 +191,7 @@ TEST_P(ReferencesOfEveryKind, OtherMapsAndKindsAndTheAclItselfKeepTheirs)
     EXPECT_EQ(remove_entry(kind, "m1", "10"), 0);
     // What the entry named last is "a3".
     EXPECT_EQ(references().size(), before - 1);
-    EXPECT_EQ(log_lines().back(), info("Removing " + map_level("a3")));
+    EXPECT_EQ(last_log_line(), info("Removing " + map_level("a3")));
 }
 
 TEST_P(ReferencesOfEveryKind, TheyAreCountedInTheProposedDatabase)
@@ -200,12 +200,12 @@ TEST_P(ReferencesOfEveryKind, TheyAreCountedInTheProposedDatabase)
     give_acl(kind, "m1", "10", "a1");
     set_node(commit_.olddb, kind.reference("a1", "m1", "20"), "20", bt_uint32);
     EXPECT_EQ(remove_entry(kind, "m1", "10"), 0);
-    EXPECT_EQ(log_lines().back(), info("Removing " + map_level("a1")));
+    EXPECT_EQ(last_log_line(), info("Removing " + map_level("a1")));
     forget_calls();
     set_node(commit_.newdb, kind.reference("a1", "m1", "20"), "20", bt_uint32);
     set_node(commit_.newdb, kind.reference("a1", "m1", "30"), "30", bt_uint32);
     EXPECT_EQ(remove_entry(kind, "m1", "10"), 0);
-    EXPECT_EQ(log_lines().back(), info("Removing " + kind.reference("a1", "m1", "10")));
+    EXPECT_EQ(last_log_line(), info("Removing " + kind.reference("a1", "m1", "10")));
 }
 
 TEST_P(ReferencesOfEveryKind, AnEntryThatLosesItsAclLosesItsReference)
@@ -227,7 +227,7 @@ TEST_P(ReferencesOfEveryKind, AChangeWithoutNewAttributesIsWithoutAnAcl)
     give_acl(kind, "m1", "10", "a1");
     EXPECT_EQ(process(kind.mtype, mdct_modify, kind.acl_node("m1", "10")), 0);
     EXPECT_THAT(references(), IsEmpty());
-    EXPECT_EQ(log_lines()[2], info("refcheck: acl=(null), m1-10, old=a1"));
+    EXPECT_EQ(log_line(2), info("refcheck: acl=(null), m1-10, old=a1"));
 }
 
 TEST_P(ReferencesOfEveryKind, NoAclBeforeAndNoneAfterIsNothingToDo)
@@ -253,8 +253,7 @@ TEST_P(ReferencesOfEveryKind, AnEmptyAclBeforeHadNoReference)
     commit_.set_old(kind.acl_node("m1", "10"), "");
     EXPECT_EQ(set_acl(kind, "m1", "10", "a1"), 0);
     EXPECT_THAT(references(), ElementsAre(reference_node(kind, "m1", "10", "a1")));
-    EXPECT_EQ(log_lines().back(),
-              info("Creating ACL map entry " + kind.reference("a1", "m1", "10")));
+    EXPECT_EQ(last_log_line(), info("Creating ACL map entry " + kind.reference("a1", "m1", "10")));
 }
 
 // The new reference is written before the old one is removed, and they are the same.
@@ -276,7 +275,7 @@ TEST_P(ReferencesOfEveryKind, TheOneJustWrittenIsCounted)
     give_reference(kind, "m1", "20", "a1");
     EXPECT_EQ(set_acl(kind, "m1", "10", "a1"), 0);
     EXPECT_THAT(references(), ElementsAre(reference_node(kind, "m1", "20", "a1")));
-    EXPECT_EQ(log_lines().back(), info("Removing " + kind.reference("a1", "m1", "10")));
+    EXPECT_EQ(last_log_line(), info("Removing " + kind.reference("a1", "m1", "10")));
 }
 
 TEST_P(ReferencesOfEveryKind, ARemovedEntryLosesItsReference)
@@ -310,7 +309,7 @@ TEST_P(ReferencesOfEveryKind, AReferenceThatIsNotThereCanBeRemoved)
     commit_.set_old(kind.acl_node("m1", "10"), "a1");
     EXPECT_EQ(remove_entry(kind, "m1", "10"), 0);
     EXPECT_THAT(references(), IsEmpty());
-    EXPECT_EQ(log_lines().back(), info("Removing " + map_level("a1")));
+    EXPECT_EQ(last_log_line(), info("Removing " + map_level("a1")));
 }
 
 TEST_P(ReferencesOfEveryKind, OtherRemovalsLeaveItAlone)
@@ -397,7 +396,7 @@ TEST_P(ReferencesOfEveryKind, AListOfReferencesThatIsNotThereIsEmpty)
     arm({.operation = Operation::mdb_get_tstr_array, .way = FaultWay::without_object});
     EXPECT_EQ(remove_entry(kind, "m1", "10"), 0);
     EXPECT_THAT(references(), IsEmpty());
-    EXPECT_EQ(log_lines().back(), info("Removing " + map_level("a1")));
+    EXPECT_EQ(last_log_line(), info("Removing " + map_level("a1")));
 }
 
 TEST_P(ReferencesOfEveryKind, WhatWasWrittenBeforeAFailureStays)
@@ -408,7 +407,7 @@ TEST_P(ReferencesOfEveryKind, WhatWasWrittenBeforeAFailureStays)
     EXPECT_EQ(set_acl(kind, "m1", "10", "a2"), 14004);
     EXPECT_THAT(references(), ElementsAre(reference_node(kind, "m1", "10", "a1"),
                                           reference_node(kind, "m1", "10", "a2")));
-    EXPECT_EQ(log_lines().back(), line_of("Error code 14004 (item not found) returned"));
+    EXPECT_EQ(last_log_line(), line_of("Error code 14004 (item not found) returned"));
 }
 
 TEST_P(ReferencesOfEveryKind, AnAclOfAnotherTypeIsTheHostsCode)
@@ -417,7 +416,7 @@ TEST_P(ReferencesOfEveryKind, AnAclOfAnotherTypeIsTheHostsCode)
     set_node(commit_.olddb, kind.acl_node("m1", "10"), "7", bt_uint32);
     EXPECT_EQ(set_acl(kind, "m1", "10", "a2"), 14020);
     EXPECT_THAT(references(), IsEmpty());
-    EXPECT_EQ(log_lines().back(), line_of("Error code 14020 (type conversion failed) returned"));
+    EXPECT_EQ(last_log_line(), line_of("Error code 14020 (type conversion failed) returned"));
 }
 
 TEST_P(ReferencesOfEveryKind, APriorityThatIsNoNumberIsTheHostsCode)
@@ -425,7 +424,7 @@ TEST_P(ReferencesOfEveryKind, APriorityThatIsNoNumberIsTheHostsCode)
     const MapKind &kind = GetParam();
     EXPECT_EQ(set_acl(kind, "m1", "ten", "a1"), 14020);
     EXPECT_THAT(references(), IsEmpty());
-    EXPECT_EQ(log_lines().back(), line_of("Error code 14020 (type conversion failed) returned"));
+    EXPECT_EQ(last_log_line(), line_of("Error code 14020 (type conversion failed) returned"));
 }
 
 TEST_P(ReferencesOfEveryKind, ADatabaseThatCannotBeWrittenIsTheHostsCode)
@@ -433,7 +432,7 @@ TEST_P(ReferencesOfEveryKind, ADatabaseThatCannotBeWrittenIsTheHostsCode)
     const MapKind &kind = GetParam();
     commit_.newdb.writable = false;
     EXPECT_EQ(set_acl(kind, "m1", "10", "a1"), 14002);
-    EXPECT_EQ(log_lines().back(), line_of("Error code 14002 (assertion failed) returned"));
+    EXPECT_EQ(last_log_line(), line_of("Error code 14002 (assertion failed) returned"));
 }
 
 TEST_P(ReferencesOfEveryKind, LongNamesAreKeptWhole)
@@ -465,7 +464,7 @@ TEST_P(ReferencesOfEveryKind, ANameThatMakesNoPathIsTheHostsCode)
     const MapKind &kind = GetParam();
     for (const char *acl : {"a\\b", "/a", "a/"}) {
         EXPECT_EQ(set_acl(kind, "m1", "10", acl), 14009) << acl;
-        EXPECT_EQ(log_lines().back(), line_of("Error code 14009 (invalid path name) returned"));
+        EXPECT_EQ(last_log_line(), line_of("Error code 14009 (invalid path name) returned"));
     }
     EXPECT_EQ(remove_entry(kind, written("m\\n"), "10"), 14009);
     EXPECT_THAT(references(), IsEmpty());
@@ -530,8 +529,8 @@ TEST_P(ReferencesByIndex, TheAclBeforeIsReadAtIndex0WhateverIndexIsChanged)
     commit_.set_old(kind.entry("m1", "10") + "/match/1/acl", "a9");
     give_reference(kind, "m1", "10", "a9");
     EXPECT_EQ(process(kind.mtype, mdct_modify, kind.entry("m1", "10") + "/match/1/acl", "a2"), 0);
-    EXPECT_EQ(log_lines()[1], path_line(kind.entry("m1", "10") + "/match/0/acl"));
-    EXPECT_EQ(log_lines()[2], info("refcheck: acl=a2, m1-10, old=a1"));
+    EXPECT_EQ(log_line(1), path_line(kind.entry("m1", "10") + "/match/0/acl"));
+    EXPECT_EQ(log_line(2), info("refcheck: acl=a2, m1-10, old=a1"));
     EXPECT_THAT(references(), ElementsAre(reference_node(kind, "m1", "10", "a2"),
                                           reference_node(kind, "m1", "10", "a9")));
 }
@@ -565,11 +564,11 @@ TEST_F(References, OfSecurityEntriesAreReadBelowMap1WhateverStandsThere)
     EXPECT_EQ(process(MAP_TYPE_SEC, mdct_modify,
                       "/ov/tunneld/sec_map/config/map/map2/z1/prio/5/match/acl", "a2"),
               0);
-    EXPECT_EQ(log_lines()[1], path_line("/ov/tunneld/sec_map/config/map/map1/z1/prio/5/match/acl"));
+    EXPECT_EQ(log_line(1), path_line("/ov/tunneld/sec_map/config/map/map1/z1/prio/5/match/acl"));
     EXPECT_THAT(references(), ElementsAre("/ov/tunneld/acl/config/a2/secmap/z1/prio/5 uint32 5"));
     EXPECT_EQ(process(MAP_TYPE_SEC, mdct_delete, "/ov/tunneld/sec_map/config/map/map3/z1/prio/5"),
               0);
-    EXPECT_EQ(log_lines().back(), info("Removing /ov/tunneld/acl/config/a1/secmap/z1"));
+    EXPECT_EQ(last_log_line(), info("Removing /ov/tunneld/acl/config/a1/secmap/z1"));
 }
 
 TEST_F(References, OfSecurityEntriesHaveNoMatchIndex)

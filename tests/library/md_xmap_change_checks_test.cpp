@@ -156,7 +156,7 @@ TEST_P(ChangeChecksOfEveryKind, ARefusalThatCannotBeReportedIsAnError)
 {
     arm({.operation = Operation::md_commit_set_return_status_msg, .code = 14004});
     EXPECT_EQ(add_set(), 14004);
-    EXPECT_EQ(log_lines().back(), line_of(set_function, not_found));
+    EXPECT_EQ(last_log_line(), line_of(set_function, not_found));
     forget_calls();
     arm({.operation = Operation::md_commit_set_return_status_msg, .code = 14120});
     EXPECT_EQ(add_set(), 14120);
@@ -176,7 +176,7 @@ TEST_P(ChangeChecksOfEveryKind, LongNamesAreKeptWhole)
     for (const std::size_t size : {255U, 256U, 600U}) {
         const std::string map(size, 'm');
         EXPECT_EQ(check_set(GetParam().mtype, mdct_add, GetParam().set_node(map, "10")), 80000);
-        EXPECT_EQ(log_lines().back(), path_line(GetParam().match_node(map, "10")));
+        EXPECT_EQ(last_log_line(), path_line(GetParam().match_node(map, "10")));
         commit_.set_new(GetParam().match_node(map, "10") + "/0/acl", "a1");
         EXPECT_EQ(check_set(GetParam().mtype, mdct_add, GetParam().set_node(map, "10")), 0);
     }
@@ -188,7 +188,7 @@ TEST_P(ChangeChecksOfEveryKind, AMapWithASlashInItsNameMatchesNothing)
     const std::string map = written("m/n");
     commit_.set_new(GetParam().match_node(map, "10") + "/0/acl", "a1");
     EXPECT_EQ(check_set(GetParam().mtype, mdct_add, GetParam().set_node(map, "10")), 80000);
-    EXPECT_EQ(log_lines().back(), path_line(GetParam().match_node("m/n", "10")));
+    EXPECT_EQ(last_log_line(), path_line(GetParam().match_node("m/n", "10")));
     EXPECT_EQ(check_set(GetParam().mtype, mdct_add, GetParam().set_node(written("m\\n"), "10")),
               14009);
 }
@@ -297,7 +297,7 @@ TEST_F(ChangeChecks, WhatASecurityEntryMatchesIsLookedUpBelowMap1WhateverStandsT
     const std::string set_node = "/ov/tunneld/sec_map/config/map/map2/z1/prio/5/set";
     commit_.set_new("/ov/tunneld/sec_map/config/map/map2/z1/prio/5/match/acl", "a1");
     EXPECT_EQ(check_set(MAP_TYPE_SEC, mdct_add, set_node), 80000);
-    EXPECT_EQ(log_lines().back(), path_line("/ov/tunneld/sec_map/config/map/map1/z1/prio/5/match"));
+    EXPECT_EQ(last_log_line(), path_line("/ov/tunneld/sec_map/config/map/map1/z1/prio/5/match"));
     commit_.set_new("/ov/tunneld/sec_map/config/map/map1/z1/prio/5/match/acl", "a1");
     EXPECT_EQ(check_set(MAP_TYPE_SEC, mdct_add, set_node), 0);
 }
@@ -367,7 +367,7 @@ TEST_F(ChangeChecks, ADnsProxyMapIsUnknownAndLimited)
     EXPECT_THAT(log_lines(), ElementsAre(unknown_type));
     EXPECT_EQ(check_set(MAP_TYPE_DNS_PROXY, mdct_add, "/ov/dnsproxy/config/0/map/m1/prio/1/set/x"),
               0);
-    EXPECT_EQ(log_lines().back(), unknown_map_type);
+    EXPECT_EQ(last_log_line(), unknown_map_type);
 }
 
 TEST_F(ChangeChecks, NullArgumentsAreRefused)

@@ -155,7 +155,7 @@ TEST_P(LimitsOfEveryKind, WithAMaximumOf0NoEntryIsAccepted)
     set_maximum(0);
     EXPECT_EQ(add_entry(kind()), "0 refused");
     EXPECT_THAT(commit_.commit.refusals, ElementsAre(entries_refused));
-    EXPECT_EQ(log_lines().back(), maximum_reached(0));
+    EXPECT_EQ(last_log_line(), maximum_reached(0));
 }
 
 TEST_P(LimitsOfEveryKind, EntriesOfOtherKindsAreNoneOfThisOnes)
@@ -180,7 +180,7 @@ TEST_P(LimitsOfEveryKind, ARefusalThatCannotBeReportedIsNone)
                            line_of(check_function, not_found)}));
     arm({.operation = Operation::md_commit_set_return_status_msg, .code = 14120});
     EXPECT_EQ(add_entry(kind()), "14120 accepted");
-    EXPECT_EQ(log_lines().back(), maximum_reached(0));
+    EXPECT_EQ(last_log_line(), maximum_reached(0));
     EXPECT_EQ(num_calls(Operation::bail_quiet_debug), 2U);
 }
 
