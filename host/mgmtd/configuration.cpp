@@ -64,6 +64,16 @@ Configuration::Configuration(const std::filesystem::path &state_dir)
     engine_.add_module(schema_);
     engine_.add_module(model_);
     engine_.add_module(tunnels_);
+    // Maps look for the ACLs that they name.
+    engine_.add_module(acls_);
+    engine_.add_module(applications_);
+    engine_.add_module(vlans_);
+    engine_.add_module(labels_);
+    engine_.add_module(preferred_interfaces_);
+    for (MapsModule &maps : maps_) {
+        engine_.add_module(maps);
+    }
+    engine_.add_module(dns_proxy_maps_);
     engine_.add_module(limits_);
     engine_.add_module(events_);
     engine_.load();

@@ -5,8 +5,13 @@
 #include "host/commit/candidate.h"
 #include "host/commit/engine.h"
 #include "host/framework/objects.h"
+#include "host/modules/acls.h"
+#include "host/modules/applications.h"
 #include "host/modules/change_events.h"
+#include "host/modules/dns_proxy_maps.h"
+#include "host/modules/interfaces.h"
 #include "host/modules/limits.h"
+#include "host/modules/maps.h"
 #include "host/modules/model.h"
 #include "host/modules/schema.h"
 #include "host/modules/tunnels.h"
@@ -15,6 +20,7 @@
 #include <cstdint>
 #include <filesystem>
 #include <string>
+#include <vector>
 
 namespace ovhost
 {
@@ -58,6 +64,13 @@ class Configuration
     SchemaModule schema_;
     ModelModule model_;
     TunnelsModule tunnels_;
+    AclsModule acls_;
+    ApplicationsModule applications_;
+    VlansModule vlans_;
+    InterfaceLabelsModule labels_;
+    PreferredInterfacesModule preferred_interfaces_;
+    std::vector<MapsModule> maps_{map_kinds.begin(), map_kinds.end()};
+    DnsProxyMapsModule dns_proxy_maps_;
     LimitsModule limits_;
     ChangeEventsModule events_;
     CommitEngine engine_;

@@ -4,6 +4,7 @@
 #include "host/control/arguments.h"
 #include "host/control/request_error.h"
 #include "host/mgmtd/configuration.h"
+#include "host/mgmtd/show_maps.h"
 #include "host/modules/mode.h"
 #include "host/modules/tunnel_lookup.h"
 #include "host/modules/tunnel_tables.h"
@@ -131,6 +132,9 @@ constexpr Subject subjects[] = {
     {"tunnels", show_tunnels},
     {"tunnel", show_tunnel},
     {"tunnel-tables", show_tunnel_tables},
+    {"maps", show_maps},
+    {"acl", show_acl},
+    {"references", show_references},
 };
 
 } // namespace

@@ -1,6 +1,6 @@
 #pragma once
 // The answers to the command "show": what the running configuration amounts to. requests.h has all
-// other commands.
+// other commands, show_maps.h the answers about maps and ACLs.
 
 #include <nlohmann/json_fwd.hpp>
 

@@ -1,7 +1,10 @@
 #include "host/modules/schema.h"
 
 #include "framework/md_commit.h"
+#include "host/modules/commit_access.h"
+#include "host/modules/map_kinds.h"
 #include "host/modules/node_access.h"
+#include "host/tree/name.h"
 
 #include <algorithm>
 #include <array>
@@ -13,37 +16,88 @@ namespace
 {
 
 struct NodeRule {
-    const char *pattern;
+    std::string pattern;
     bn_type type;
     /// The texts that are allowed, up to the first null; none: every text of the type.
-    std::array<const char *, 4> texts;
+    std::array<const char *, 4> texts = {};
 };
 
-constexpr NodeRule node_rules[] = {
+const NodeRule fixed_rules[] = {
     {"/ov/tunneld/system/config/mode", bt_string, {"bridge", "router", "server"}},
-    {"/ov/tunneld/system/config/submode", bt_string, {}},
-    {"/ov/tunneld/system/config/routing_inline", bt_bool, {}},
-    {"/ov/tunneld/system/config/mode/router/*/ifname", bt_string, {}},
-    {"/ov/tunneld/system/config/10g", bt_bool, {}},
-    {"/ov/tunneld/system/config/bonding", bt_bool, {}},
-    {"/ov/tunneld/system/config/limits/*", bt_uint32, {}},
-    {"/ov/tunneld/tunnel/config/*", bt_string, {}},
-    {"/ov/tunneld/tunnel/config/*/alias", bt_string, {}},
-    {"/ov/tunneld/tunnel/config/*/id", bt_uint16, {}},
-    {"/ov/tunneld/tunnel/config/*/remote", bt_ipaddr, {}},
-    {"/ov/tunneld/tunnel/config/*/bandwidth", bt_uint32, {}},
-    {"/ov/model/config/name", bt_string, {}},
-    {"/ov/model/limits/*", bt_uint32, {}},
+    {"/ov/tunneld/system/config/submode", bt_string},
+    {"/ov/tunneld/system/config/routing_inline", bt_bool},
+    {"/ov/tunneld/system/config/mode/router/*/ifname", bt_string},
+    {"/ov/tunneld/system/config/10g", bt_bool},
+    {"/ov/tunneld/system/config/bonding", bt_bool},
+    {"/ov/tunneld/system/config/limits/*", bt_uint32},
+    {"/ov/tunneld/tunnel/config/*", bt_string},
+    {"/ov/tunneld/tunnel/config/*/alias", bt_string},
+    {"/ov/tunneld/tunnel/config/*/id", bt_uint16},
+    {"/ov/tunneld/tunnel/config/*/remote", bt_ipaddr},
+    {"/ov/tunneld/tunnel/config/*/bandwidth", bt_uint32},
+    {"/ov/tunneld/acl/config/*", bt_string},
+    {"/ov/tunneld/acl/config/*/entry/*", bt_uint16},
+    {"/ov/tunneld/acl/config/*/entry/*/matchstr", bt_string},
+    {"/ov/tunneld/acl/config/*/entry/*/protocol", bt_string},
+    {"/ov/tunneld/acl/config/*/entry/*/application", bt_string},
+    {"/ov/tunneld/app/config/*/name", bt_string},
+    {"/ov/tunneld/net/interface/tunnel/vlan/config/*", bt_string},
+    {"/ov/tunneld/net/routes/config/ipv4/prefix/*/nhop/*/preferred_if", bt_string},
+    {"/ov/iflabels/config/*/*", bt_string},
+    {"/ov/model/config/name", bt_string},
+    {"/ov/model/limits/*", bt_uint32},
 };
+
+void add_map_rules(std::vector<NodeRule> &rules, const MapKind &kind)
+{
+    const std::string map = std::string(kind.root_pattern) + "/*";
+    const std::string entry = map + "/prio/*";
+    const std::string match = entry + (is_security_map(kind) ? "/match/" : "/match/*/");
+    rules.push_back({map, bt_string});
+    rules.push_back({entry, bt_uint16});
+    for (const char *leaf : {"acl", "matchstr", "application"}) {
+        rules.push_back({match + leaf, bt_string});
+    }
+    rules.push_back({"/ov/tunneld/acl/config/*/" + std::string(kind.key) + "/*/prio/*", bt_uint32});
+}
+
+/// A rule with its pattern taken apart: every change is held against every rule.
+struct ReadyRule {
+    NodeRule rule;
+    NamePattern pattern;
+};
+
+std::vector<ReadyRule> make_rules()
+{
+    std::vector<NodeRule> rules(std::begin(fixed_rules), std::end(fixed_rules));
+    for (const MapKind &kind : map_kinds) {
+        add_map_rules(rules, kind);
+    }
+    for (const char *leaf : {"auto_mod", "auto_prefif"}) {
+        rules.push_back(
+            {std::string(map_kinds.front().root) + "/*/prio/*/set/0/" + leaf, bt_string});
+    }
+    std::vector<ReadyRule> ready;
+    for (NodeRule &rule : rules) {
+        NamePattern pattern = NamePattern::parse(rule.pattern).value();
+        ready.push_back({std::move(rule), std::move(pattern)});
+    }
+    return ready;
+}
+
+const std::vector<ReadyRule> &node_rules()
+{
+    static const std::vector<ReadyRule> rules = make_rules();
+    return rules;
+}
 
 const NodeRule *rule_of(const mdb_db_change *change)
 {
-    const auto rule = std::find_if(std::begin(node_rules), std::end(node_rules),
-                                   [change](const NodeRule &candidate) {
-                                       return bn_binding_name_parts_pattern_match(
-                                           change->mdc_name_parts, true, candidate.pattern);
-                                   });
-    return rule != std::end(node_rules) ? rule : nullptr;
+    const std::vector<std::string> parts = name_parts(change);
+    const auto rule = std::ranges::find_if(node_rules(), [&parts](const ReadyRule &candidate) {
+        return candidate.pattern.matches(parts);
+    });
+    return rule != node_rules().end() ? &rule->rule : nullptr;
 }
 
 /// "bridge, router or server"; empty when every text is allowed.
@@ -71,8 +125,8 @@ bool is_choice(const NodeRule &rule, std::string_view text)
 std::vector<std::string> SchemaModule::patterns() const
 {
     std::vector<std::string> patterns;
-    for (const NodeRule &rule : node_rules) {
-        patterns.emplace_back(rule.pattern);
+    for (const ReadyRule &ready : node_rules()) {
+        patterns.push_back(ready.rule.pattern);
     }
     return patterns;
 }

@@ -1,6 +1,7 @@
 #include "host/modules/tunnel_ids.h"
 
 #include "framework/appliance.h"
+#include "host/modules/commit_access.h"
 #include "host/modules/node_access.h"
 #include "host/modules/tunnel_nodes.h"
 #include "orvale/md_tunbin_ht.h"
@@ -30,14 +31,7 @@ struct IdNeeds {
 void write_field(const md_dbinfo *dbinfo, const std::string &name, const char *field, bn_type type,
                  const std::string &text)
 {
-    // The checks of a commit may write the database that it proposes.
-    auto *const newdb = const_cast<mdb_db *>(dbinfo->newdb);
-    const int err = mdb_set_node_str(dbinfo->commit, newdb, bsso_modify, 0, type, text.c_str(),
-                                     "%s", tunnel_node(name, field).c_str());
-    if (err != 0) {
-        throw std::runtime_error("cannot write the " + std::string(field) + " of tunnel \"" + name +
-                                 "\": error code " + std::to_string(err));
-    }
+    propose(dbinfo, tunnel_node(name, field), type, text);
 }
 
 void write_id(const md_dbinfo *dbinfo, const std::string &name, uint32 id)

@@ -1,6 +1,7 @@
 #include "host/ovctl/command_table.h"
 
 #include "host/ovctl/render.h"
+#include "host/ovctl/render_maps.h"
 #include "host/ovctl/render_tunnels.h"
 #include "host/ovctl/text_input.h"
 
@@ -54,6 +55,14 @@ constexpr ArgumentSpec tunnel_arguments[] = {
     {text, "name", "The tunnel of this name"},
     {text, "alias", "The tunnel of this alias"},
     {text, "id", "The tunnel of this ID"},
+};
+
+constexpr ArgumentSpec acl_arguments[] = {
+    {positional, "name", "The ACL's name"},
+};
+
+constexpr ArgumentSpec references_arguments[] = {
+    {flag, "check", "Compare them with the maps; exit code 1 when they differ"},
 };
 
 json no_arguments(const Arguments &)
@@ -118,6 +127,21 @@ json show_tunnel_request(const Arguments &arguments)
     if (key == "id")
         return {{"what", "tunnel"}, {"tunnel_id", checked_number(value, "the ID")}};
     return {{"what", "tunnel"}, {key, checked_utf8(value, "the " + key)}};
+}
+
+json show_maps_request(const Arguments &)
+{
+    return {{"what", "maps"}};
+}
+
+json show_acl_request(const Arguments &arguments)
+{
+    return {{"what", "acl"}, {"name", checked_utf8(arguments.at("name"), "NAME")}};
+}
+
+json show_references_request(const Arguments &arguments)
+{
+    return {{"what", "references"}, {"check", arguments.contains("check")}};
 }
 
 constexpr Command table[] = {
@@ -198,6 +222,19 @@ constexpr Command table[] = {
      show_tunnel_tables_request,
      render_tunnel_tables,
      "the query"},
+    {"show maps",
+     "List the entries of all maps with what they match",
+     "ovctl show maps",
+     {},
+     "show",
+     show_maps_request,
+     render_maps,
+     "the query"},
+    {"show acl", "Print an ACL's entries and the map entries that refer to it",
+     "ovctl show acl web", acl_arguments, "show", show_acl_request, render_acl, "the query"},
+    {"show references", "List the references from ACLs to the map entries that name them",
+     "ovctl show references --check", references_arguments, "show", show_references_request,
+     render_references, "the query", has_reference_faults},
 };
 
 } // namespace

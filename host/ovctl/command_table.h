@@ -41,6 +41,9 @@ struct Command {
     void (*render)(const nlohmann::json &result, std::ostream &out);
     /// What is refused when the command is: "mgmtd refused the commit: ...".
     const char *subject;
+    /// Whether a result is itself bad news, so that the exit code is that of a refusal; null: none
+    /// is.
+    bool (*is_bad)(const nlohmann::json &result) = nullptr;
 };
 
 [[nodiscard]] std::span<const Command> commands();

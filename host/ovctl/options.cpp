@@ -19,7 +19,7 @@ constexpr const char *footer =
     "A value that starts with a hyphen goes behind --: ovctl set -- NAME TYPE -VALUE\n\n"
     "Exit codes:\n"
     "  0  done\n"
-    "  1  mgmtd refused or failed; the messages say why\n"
+    "  1  mgmtd refused or failed, or a check found something; the messages say why\n"
     "  2  the command line, or a file named on it, is wrong\n"
     "  3  mgmtd cannot be reached or did not answer\n"
     "  4  the answer was not understood\n\n"

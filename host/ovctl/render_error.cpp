@@ -6,12 +6,30 @@
 #include <nlohmann/json.hpp>
 
 #include <ostream>
+#include <string>
+#include <vector>
 
 namespace ovhost
 {
 
 namespace
 {
+
+/// One at least. What follows the first indents itself by two blanks, as the library's messages do.
+std::vector<std::string> lines_of(std::string text)
+{
+    if (text.ends_with('\n'))
+        text.pop_back();
+    std::vector<std::string> lines;
+    std::size_t begin = 0;
+    for (std::size_t end = text.find('\n'); end != std::string::npos;
+         end = text.find('\n', begin)) {
+        lines.push_back(text.substr(begin, end - begin));
+        begin = end + 1;
+    }
+    lines.push_back(text.substr(begin));
+    return lines;
+}
 
 void print_detail(const ErrorDetail &detail, std::ostream &err)
 {
@@ -20,10 +38,13 @@ void print_detail(const ErrorDetail &detail, std::ostream &err)
         err << "line " << detail.line << ": ";
     if (!detail.node.empty())
         err << printable(detail.node) << ": ";
-    err << printable(detail.message);
+    const std::vector<std::string> lines = lines_of(detail.message);
+    err << printable(lines.front());
     if (!detail.module.empty())
         err << " (" << printable(detail.module) << ')';
     err << '\n';
+    for (auto line = lines.begin() + 1; line != lines.end(); ++line)
+        err << "  " << printable(*line) << '\n';
 }
 
 } // namespace

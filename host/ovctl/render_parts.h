@@ -1,11 +1,13 @@
 #pragma once
-// What the renderers (render.h, render_tunnels.h) have in common: members of a result as text for
-// people. A member that is missing or of another type throws nlohmann::json::exception.
+// What the renderers (render.h, render_tunnels.h, render_maps.h) have in common: members of a
+// result as text for people. A member that is missing or of another type throws
+// nlohmann::json::exception.
 
 #include <nlohmann/json_fwd.hpp>
 
 #include <iosfwd>
 #include <string>
+#include <vector>
 
 namespace ovhost
 {
@@ -23,5 +25,13 @@ namespace ovhost
 
 /// Names and values in two columns.
 void print_fact(std::ostream &out, const char *name, const std::string &value);
+
+/// Columns on a terminal that a text takes up, as far as its bytes tell: those that continue a
+/// character take up none.
+[[nodiscard]] std::size_t width_of(const std::string &text);
+
+/// Rows of equally many cells; the first has the headings.
+using TableRows = std::vector<std::vector<std::string>>;
+void print_table(std::ostream &out, const TableRows &rows);
 
 } // namespace ovhost

@@ -32,14 +32,6 @@ std::string alias_of(const json &tunnel)
     return text_of(tunnel, "alias") + (ambiguous ? " (ambiguous)" : "");
 }
 
-/// Columns on a terminal that a text takes up, as far as its bytes tell: those that continue a
-/// character take up none.
-std::size_t width_of(const std::string &text)
-{
-    return static_cast<std::size_t>(std::ranges::count_if(
-        text, [](char byte) { return (static_cast<unsigned char>(byte) & 0xc0) != 0x80; }));
-}
-
 /// Two columns go before the last one.
 void print_row(std::ostream &out, std::size_t name_width, const std::string &name,
                const std::string &id, const std::string &alias)

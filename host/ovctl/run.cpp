@@ -43,7 +43,7 @@ ExitCode report(const Failure &failure, const std::string &message, const Option
     return failure.exit;
 }
 
-void ask_and_print(const Invocation &invocation, std::ostream &out)
+ExitCode ask_and_print(const Invocation &invocation, std::ostream &out)
 {
     const Command &command = *invocation.command;
     const json arguments = command.build(invocation.arguments);
@@ -55,6 +55,7 @@ void ask_and_print(const Invocation &invocation, std::ostream &out)
         out << to_line({{"ok", true}, {"result", result}});
     else
         command.render(result, out);
+    return command.is_bad != nullptr && command.is_bad(result) ? ExitCode::refused : ExitCode::ok;
 }
 
 /// What is refused, with the file by the name that the user gave it.
@@ -75,8 +76,7 @@ ExitCode run_command(const Invocation &invocation, std::ostream &out, std::ostre
         return report(failure, message, options, out, err);
     };
     try {
-        ask_and_print(invocation, out);
-        return ExitCode::ok;
+        return ask_and_print(invocation, out);
     } catch (const RequestError &refusal) {
         if (options.json)
             render_error_json(refusal, out);

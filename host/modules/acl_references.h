@@ -1,0 +1,54 @@
+#pragma once
+// References from ACLs to the map entries that name them. The library keeps a record for each
+// (md_acl_ref_processing); here they are read, and compared with what the maps say.
+//
+// acl_nodes.h has the nodes, acls.h the module that keeps users from writing records.
+
+#include "host/modules/map_kinds.h"
+
+#include "framework/mdb_db.h"
+
+#include <string>
+#include <vector>
+
+namespace ovhost
+{
+
+/// An entry of a map.
+struct MapEntry {
+    const MapKind *kind = nullptr;
+    std::string map;
+    std::string priority;
+
+    bool operator==(const MapEntry &) const = default;
+};
+
+/// "route-map m1, entry 10"
+[[nodiscard]] std::string describe(const MapEntry &entry);
+
+/// The ACL that the entry refers to; empty when there is none. The default entry of a map refers to
+/// none, whatever it names.
+[[nodiscard]] std::string acl_of(const mdb_db *db, const MapEntry &entry);
+
+/// The full name of the record of an entry.
+[[nodiscard]] std::string reference_node(const std::string &acl, const MapEntry &entry);
+
+/// The entries of which an ACL has records, whether they still name it or not.
+[[nodiscard]] std::vector<MapEntry> recorded_references(const mdb_db *db, const std::string &acl);
+
+/// Where records and maps do not agree.
+struct ReferenceFault {
+    std::string acl;
+    MapEntry entry;
+    std::string message;
+};
+
+struct ReferenceCheck {
+    std::size_t records = 0;
+    std::vector<ReferenceFault> faults;
+};
+
+/// Compares all records with all maps.
+[[nodiscard]] ReferenceCheck check_references(const mdb_db *db);
+
+} // namespace ovhost

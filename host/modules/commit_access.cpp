@@ -1,0 +1,77 @@
+#include "host/modules/commit_access.h"
+
+#include "host/modules/node_access.h"
+
+#include <stdexcept>
+
+namespace ovhost
+{
+
+std::vector<std::string> name_parts(const mdb_db_change *change)
+{
+    const tstr_array *const array = change->mdc_name_parts;
+    const auto count = static_cast<uint32>(tstr_array_length_quick(array));
+    std::vector<std::string> parts;
+    parts.reserve(count);
+    for (uint32 i = 0; i < count; ++i) {
+        parts.emplace_back(tstr_array_get_str_quick(array, i));
+    }
+    return parts;
+}
+
+bool matches(const mdb_db_change *change, const std::string &pattern)
+{
+    return bn_binding_name_parts_pattern_match(change->mdc_name_parts, true, pattern.c_str());
+}
+
+std::optional<std::string> new_text(const mdb_db_change *change)
+{
+    const TstringPtr text = attribute_text(change->mdc_new_attribs);
+    return text ? std::optional<std::string>(ts_str(text.get())) : std::nullopt;
+}
+
+std::vector<std::string> patterns_below(const std::string &root, unsigned levels)
+{
+    std::vector<std::string> patterns;
+    std::string pattern = root;
+    for (unsigned level = 0; level < levels; ++level) {
+        pattern += "/*";
+        patterns.push_back(pattern);
+    }
+    return patterns;
+}
+
+std::optional<std::string> own_name_fault(const char *thing, const std::string &name,
+                                          const mdb_db_change *change)
+{
+    return new_text(change) == name
+               ? std::nullopt
+               : std::optional(std::string("must hold ") + thing + ", \"" + name + "\"");
+}
+
+int refuse(const md_dbinfo *dbinfo, const std::string &message)
+{
+    return md_commit_set_return_status_msg(dbinfo->commit, 1, message.c_str());
+}
+
+void propose(const md_dbinfo *dbinfo, const std::string &node, bn_type type,
+             const std::string &text)
+{
+    // The checks of a commit may write the database that it proposes.
+    auto *const newdb = const_cast<mdb_db *>(dbinfo->newdb);
+    const int err = mdb_set_node_str(dbinfo->commit, newdb, bsso_modify, 0, type, text.c_str(),
+                                     "%s", node.c_str());
+    if (err != 0) {
+        throw std::runtime_error("cannot write " + node + ": error code " + std::to_string(err));
+    }
+}
+
+void propose_missing(const md_dbinfo *dbinfo, const std::string &node, bn_type type,
+                     const std::string &text)
+{
+    if (!node_text(dbinfo->newdb, node)) {
+        propose(dbinfo, node, type, text);
+    }
+}
+
+} // namespace ovhost

@@ -1,0 +1,41 @@
+#pragma once
+// What a check needs of the commit that it is part of: the changed node's name, words to refuse the
+// commit with, and the right to amend it. node_access.h reads nodes.
+
+#include "framework/md_commit.h"
+
+#include <optional>
+#include <string>
+#include <vector>
+
+namespace ovhost
+{
+
+/// The components of the changed node's name, escapes resolved.
+[[nodiscard]] std::vector<std::string> name_parts(const mdb_db_change *change);
+
+[[nodiscard]] bool matches(const mdb_db_change *change, const std::string &pattern);
+
+/// The changed node's new value as text; nothing for a deleted node.
+[[nodiscard]] std::optional<std::string> new_text(const mdb_db_change *change);
+
+/// ROOT/*, ROOT/*/* and so on: everything below a root, down to so many levels.
+[[nodiscard]] std::vector<std::string> patterns_below(const std::string &root, unsigned levels);
+
+/// What is wrong with a node that must hold its own name; `thing` says what that is.
+[[nodiscard]] std::optional<std::string> own_name_fault(const char *thing, const std::string &name,
+                                                        const mdb_db_change *change);
+
+/// Refuses the commit; the answer is what a check then returns.
+[[nodiscard]] int refuse(const md_dbinfo *dbinfo, const std::string &message);
+
+/// Writes a node of the database that the commit proposes. Throws std::runtime_error, whose words
+/// then refuse the commit.
+void propose(const md_dbinfo *dbinfo, const std::string &node, bn_type type,
+             const std::string &text);
+
+/// Writes the node when it holds no value in the proposed database.
+void propose_missing(const md_dbinfo *dbinfo, const std::string &node, bn_type type,
+                     const std::string &text);
+
+} // namespace ovhost

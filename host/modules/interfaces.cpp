@@ -1,0 +1,95 @@
+#include "host/modules/interfaces.h"
+
+#include "framework/appliance.h"
+#include "host/modules/commit_access.h"
+#include "host/modules/match_strings.h"
+#include "host/modules/node_access.h"
+#include "host/modules/plain_names.h"
+#include "orvale/md_xmap_common.h"
+
+namespace ovhost
+{
+namespace
+{
+
+// The library takes component 7 for the VLAN's name.
+constexpr const char *vlan_pattern = "/ov/tunneld/net/interface/tunnel/vlan/config/*";
+constexpr const char *label_pattern = "/ov/iflabels/config/*/*";
+constexpr const char *preferred_pattern =
+    "/ov/tunneld/net/routes/config/ipv4/prefix/*/nhop/*/preferred_if";
+
+bool is_deleted(const mdb_db_change *change)
+{
+    return change->mdc_change_type == mdct_delete;
+}
+
+bool has_preferred_interface(const mdb_db *db)
+{
+    tstr_array *array = nullptr;
+    const int err = mdb_get_matching_tstr_array(nullptr, db, preferred_pattern,
+                                                mdqf_sel_class_no_state, &array);
+    const TstrArrayPtr nodes(array);
+    return err == 0 && nodes != nullptr && tstr_array_length_quick(nodes.get()) > 0;
+}
+
+} // namespace
+
+std::vector<std::string> VlansModule::patterns() const
+{
+    return {vlan_pattern};
+}
+
+int VlansModule::check_change(md_dbinfo *dbinfo, mdb_db_change *change)
+{
+    if (is_deleted(change)) {
+        // Refused, the words are those of the library.
+        return md_vlan_is_used_in_rmap(change, dbinfo);
+    }
+    const std::string name = name_parts(change).back();
+    return ovlan_valid_name_check(name.c_str()) == 0
+               ? 0
+               : refuse(dbinfo, "\"" + name + "\" is not a name that a VLAN can have");
+}
+
+std::vector<std::string> InterfaceLabelsModule::patterns() const
+{
+    return {label_pattern};
+}
+
+int InterfaceLabelsModule::check_change(md_dbinfo *dbinfo, mdb_db_change *change)
+{
+    const std::string label = name_parts(change).back();
+    if (!is_deleted(change)) {
+        const auto fault = plain_name_fault("an interface label", label);
+        return fault ? refuse(dbinfo, *fault) : 0;
+    }
+    // Another category may still have it.
+    const std::optional<MapEntry> user = md_xmap_iflabel_check(label.c_str(), dbinfo->newdb)
+                                             ? std::nullopt
+                                             : entry_that_matches_vlan(dbinfo->newdb, label);
+    return user ? refuse(dbinfo, "Cannot delete an interface label when used by a " +
+                                     std::string(user->kind->name) + ".\n  Please remove " +
+                                     "vlan:" + label + " from " + describe(*user) + " first.")
+                : 0;
+}
+
+std::vector<std::string> PreferredInterfacesModule::patterns() const
+{
+    return {preferred_pattern};
+}
+
+int PreferredInterfacesModule::check_change(md_dbinfo *dbinfo, mdb_db_change *change)
+{
+    if (!is_deleted(change) || has_preferred_interface(dbinfo->newdb)) {
+        return 0;
+    }
+    tbool is_used = false;
+    const int err = md_preferred_if_is_used_in_rmap(change, dbinfo, &is_used);
+    return err == 0 && is_used
+               ? refuse(dbinfo, "Cannot delete the last preferred interface when used by a "
+                                "route-map.\n  Please change auto_mod \"preferred-if\" of the "
+                                "route-map's entries first, in a commit of its own.")
+               : err;
+}
+
+} // namespace ovhost

@@ -1,0 +1,87 @@
+#include "host/modules/map_lookup.h"
+
+#include "host/modules/acl_nodes.h"
+#include "host/modules/node_access.h"
+#include "host/tree/name.h"
+
+namespace ovhost
+{
+namespace
+{
+
+constexpr const char *dns_proxy_root = "/ov/dnsproxy/config/0/map";
+
+/// A text as the operations take it ends at its first NUL byte, which no name holds.
+bool is_plain(const std::string &text)
+{
+    return text.find('\0') == std::string::npos;
+}
+
+MapFacts facts_of(const mdb_db *db, const MapKind &kind, const std::string &map)
+{
+    MapFacts facts{kind.name, map, {}};
+    for (const std::string &priority : child_names(db, map_node(kind, map) + "/prio")) {
+        facts.entries.push_back({priority, node_text(db, match_node(kind, map, priority, "acl")),
+                                 node_text(db, match_node(kind, map, priority, "matchstr"))});
+    }
+    return facts;
+}
+
+void add_dns_proxy_maps(const mdb_db *db, std::vector<MapFacts> &maps)
+{
+    for (const std::string &map : child_names(db, dns_proxy_root)) {
+        MapFacts facts{"dns-proxy-map", map, {}};
+        const std::string entries =
+            std::string(dns_proxy_root) + "/" + escape_component(map) + "/prio";
+        for (const std::string &priority : child_names(db, entries)) {
+            facts.entries.push_back({priority, std::nullopt, std::nullopt});
+        }
+        maps.push_back(std::move(facts));
+    }
+}
+
+AclEntryFacts facts_of_entry(const mdb_db *db, const std::string &acl, const std::string &number)
+{
+    AclEntryFacts facts{number, {}};
+    const std::string entry = acl_entry_node(acl, number);
+    for (const std::string &field : child_names(db, entry)) {
+        if (const auto value = node_text(db, entry + "/" + escape_component(field))) {
+            facts.fields.emplace_back(field, *value);
+        }
+    }
+    return facts;
+}
+
+} // namespace
+
+std::vector<MapFacts> list_maps(const mdb_db *db)
+{
+    std::vector<MapFacts> maps;
+    for (const MapKind &kind : map_kinds) {
+        for (const std::string &map : child_names(db, kind.root)) {
+            maps.push_back(facts_of(db, kind, map));
+        }
+    }
+    add_dns_proxy_maps(db, maps);
+    return maps;
+}
+
+std::optional<AclFacts> find_acl(const mdb_db *db, const std::string &acl)
+{
+    if (!is_plain(acl) || !has_acl(db, acl)) {
+        return std::nullopt;
+    }
+    AclFacts facts;
+    for (const std::string &number : child_names(db, acl_node(acl) + "/entry")) {
+        facts.entries.push_back(facts_of_entry(db, acl, number));
+    }
+    facts.references = recorded_references(db, acl);
+    return facts;
+}
+
+std::vector<std::string> list_acls(const mdb_db *db)
+{
+    return child_names(db, acls_node);
+}
+
+} // namespace ovhost

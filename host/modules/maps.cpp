@@ -1,0 +1,60 @@
+#include "host/modules/maps.h"
+
+#include "host/modules/commit_access.h"
+#include "host/modules/map_checks.h"
+#include "host/modules/match_strings.h"
+#include "orvale/md_xmap_common.h"
+
+namespace ovhost
+{
+namespace
+{
+
+/// Deep enough for an entry's older form, "prio/10/match/0/source/addr/ipv4/static/mask_len".
+constexpr unsigned levels_of_a_map = 12;
+
+std::string matchstr_pattern(const MapKind &kind)
+{
+    return std::string(kind.root_pattern) + "/*/prio/*/" + kind.match + "/matchstr";
+}
+
+} // namespace
+
+std::vector<std::string> MapsModule::patterns() const
+{
+    return patterns_below(kind_.root_pattern, levels_of_a_map);
+}
+
+int MapsModule::check_change(md_dbinfo *dbinfo, mdb_db_change *change)
+{
+    const std::optional<MapChange> changed = map_change(kind_, change);
+    if (!changed || bring_back(kind_, dbinfo, change, *changed)) {
+        return 0;
+    }
+    const bool is_deleted = change->mdc_change_type == mdct_delete;
+    if (!is_deleted) {
+        if (const auto fault = map_fault(kind_, dbinfo, change, *changed)) {
+            return refuse(dbinfo, *fault);
+        }
+    }
+    tbool refused = false;
+    if (const int err = md_xmap_common_change_check(change, dbinfo, kind_.type, &refused);
+        err != 0 || refused) {
+        return err;
+    }
+    if (!is_deleted && matches(change, matchstr_pattern(kind_))) {
+        const MatchStringVerdict verdict = check_match_string(dbinfo, change);
+        if (verdict.code != 0 || verdict.refused) {
+            return verdict.code;
+        }
+    }
+    if (const int err = md_acl_ref_processing(change, dbinfo, kind_.type); err != 0) {
+        return err;
+    }
+    if (!is_deleted) {
+        complete_map(kind_, dbinfo, *changed);
+    }
+    return 0;
+}
+
+} // namespace ovhost

@@ -1,0 +1,31 @@
+#include "host/modules/plain_names.h"
+
+#include "host/modules/node_access.h"
+
+namespace ovhost
+{
+
+std::optional<std::string> plain_name_fault(const char *thing, const std::string &name)
+{
+    if (name.empty() || name.size() > longest_plain_name) {
+        return std::string(thing) + " is 1 to " + std::to_string(longest_plain_name) +
+               " bytes long, not " + std::to_string(name.size());
+    }
+    const std::size_t position = name.find_first_of("/\\*");
+    if (position == std::string::npos) {
+        return std::nullopt;
+    }
+    return std::string(thing) + " must not hold \"" + name[position] + "\": choose another name";
+}
+
+std::optional<std::string> entry_number_fault(const char *thing, const std::string &number)
+{
+    constexpr uint32 last = 65535;
+    const std::optional<uint32> parsed = parse_number(number);
+    const bool is_good = parsed && *parsed >= 1 && *parsed <= last && number.front() != '0';
+    return is_good ? std::nullopt
+                   : std::optional(std::string(thing) + " is a decimal number from 1 to " +
+                                   std::to_string(last) + ", not \"" + number + "\"");
+}
+
+} // namespace ovhost
