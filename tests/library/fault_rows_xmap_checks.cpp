@@ -4,8 +4,9 @@
 #include "tests/library/map_changes.h"
 #include "tests/library/map_kinds.h"
 
-#include <iterator>
-#include <optional>
+#include <cstddef>
+#include <string>
+#include <vector>
 
 namespace ovtest
 {

@@ -4,6 +4,7 @@
 #include "tests/library/library_test.h"
 #include "tests/library/map_changes.h"
 
+#include <iterator>
 #include <string>
 #include <vector>
 
