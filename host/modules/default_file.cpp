@@ -56,7 +56,7 @@ class NoStore : public CommitStore
 {
   public:
     void load(const std::function<void(StoredNode &&)> &) const override {}
-    std::uint64_t commit(std::span<const StoredChange>) override
+    std::uint64_t commit(std::span<const StoredChange>, const CommitNote &) override
     {
         throw StoreError("there is no store");
     }
