@@ -35,7 +35,8 @@ struct ConnectHint {
 constexpr ConnectHint connect_hints[] = {
     {ENOENT, "; is mgmtd running, and is this its --socket?"},
     {ECONNREFUSED, "; no mgmtd listens there: start it"},
-    {EACCES, "; run this as the user that mgmtd runs as, or as root"},
+    {EACCES,
+     "; run this as the user that mgmtd runs as, as root, or as a member of mgmtd's --group"},
     {EAGAIN, "; mgmtd is there but takes no connections: try again later"},
 };
 
@@ -64,6 +65,13 @@ std::string in_seconds(std::chrono::milliseconds span)
 [[noreturn]] void fail_answer(const std::string &what)
 {
     throw ClientError(Kind::protocol, "mgmtd sent something that is not of the protocol: " + what);
+}
+
+Kind kind_of(const json &goodbye)
+{
+    if (goodbye == goodbye_code::replaced)
+        return Kind::replaced;
+    return goodbye == goodbye_code::stopping ? Kind::stopping : Kind::closed;
 }
 
 } // namespace
@@ -160,10 +168,9 @@ try {
     }
     if (message.contains("goodbye")) {
         const json &goodbye = message["goodbye"];
-        const auto kind =
-            goodbye.at("code") == goodbye_code::replaced ? Kind::replaced : Kind::closed;
-        goodbye_ = ClientError(kind, "mgmtd closed the connection: " +
-                                         goodbye.at("message").get<std::string>());
+        goodbye_ =
+            ClientError(kind_of(goodbye.at("code")),
+                        "mgmtd closed the connection: " + goodbye.at("message").get<std::string>());
         return std::nullopt;
     }
     const json &verdict = message.at("ok");

@@ -27,6 +27,7 @@ class ClientError : public std::runtime_error
     enum class Kind {
         unreachable, ///< no daemon behind the socket
         closed,      ///< the daemon ended the connection
+        stopping,    ///< the daemon ended the connection because it stops
         replaced,    ///< the daemon gave this peer's name to a newer connection
         timeout,     ///< no answer in time
         protocol,    ///< what came is not of the protocol

@@ -1,7 +1,6 @@
 #include "host/control/connection.h"
 
 #include "host/control/message.h"
-#include "host/support/user_name.h"
 
 #include <event2/event.h>
 #include <nlohmann/json.hpp>
@@ -26,20 +25,6 @@ timeval to_timeval(std::chrono::milliseconds span)
             .tv_usec = static_cast<suseconds_t>(span.count() % 1000 * 1000)};
 }
 
-ClientInfo credentials_of(int fd, std::uint64_t number)
-{
-    ucred credentials{};
-    socklen_t size = sizeof(credentials);
-    if (::getsockopt(fd, SOL_SOCKET, SO_PEERCRED, &credentials, &size) != 0)
-        throw std::runtime_error(std::string("cannot tell who connected: ") + std::strerror(errno));
-    return {.number = number,
-            .pid = credentials.pid,
-            .uid = credentials.uid,
-            .gid = credentials.gid,
-            .user = user_name(credentials.uid),
-            .peer = {}};
-}
-
 EventPtr new_event(EventLoop &loop, int fd, short what, event_callback_fn callback, void *context)
 {
     EventPtr result(event_new(loop.base(), fd, what, callback, context));
@@ -50,13 +35,13 @@ EventPtr new_event(EventLoop &loop, int fd, short what, event_callback_fn callba
 
 } // namespace
 
-Connection::Connection(EventLoop &loop, UniqueFd fd, std::uint64_t number,
-                       const ServerLimits &limits, Owner &owner)
-    : fd_(std::move(fd)), client_(credentials_of(fd_.get(), number)), limits_(limits),
-      owner_(owner),
+Connection::Connection(EventLoop &loop, UniqueFd fd, ClientInfo client, const ServerLimits &limits,
+                       Owner &owner)
+    : fd_(std::move(fd)), client_(std::move(client)), limits_(limits), owner_(owner),
       read_event_(new_event(loop, fd_.get(), EV_READ | EV_PERSIST, on_readable, this)),
       write_event_(new_event(loop, fd_.get(), EV_WRITE, on_writable, this)),
-      request_timer_(new_event(loop, -1, 0, on_overdue, this)), input_(limits.max_request)
+      request_timer_(new_event(loop, -1, 0, on_overdue, this)),
+      turn_event_(new_event(loop, -1, 0, on_next_turn, this)), input_(limits.max_request)
 {
     resume_reading();
 }
@@ -75,6 +60,11 @@ void Connection::on_writable(int, short what, void *connection)
 void Connection::on_overdue(int, short, void *connection)
 {
     static_cast<Connection *>(connection)->guarded(&Connection::check_request);
+}
+
+void Connection::on_next_turn(int, short, void *connection)
+{
+    static_cast<Connection *>(connection)->guarded(&Connection::serve);
 }
 
 /// The event loop is C code: an exception ends the connection it came from, not the daemon.
@@ -153,22 +143,30 @@ void Connection::serve()
     if (serving_ || finishing_)
         return;
     serving_ = true;
+    waits_for_turn_ = false;
     const bool any = serve_lines();
     serving_ = false;
-    if (over_ || finishing_)
+    if (over_ || finishing_) {
+        drop_input();
         return;
-    if (end_of_input_ || waiting() >= limits_.max_waiting)
+    }
+    if (end_of_input_ || waits_for_turn_ || waiting() >= limits_.max_waiting)
         pause_reading();
     else
         resume_reading();
-    watch_request(any);
+    if (!waits_for_turn_)
+        watch_request(any);
+    count_kept();
 }
 
 /// Whether there was a line.
 bool Connection::serve_lines()
 {
     bool any = false;
+    const auto began = std::chrono::steady_clock::now();
     while (!over_ && !finishing_ && waiting() < limits_.max_waiting) {
+        if (any && turn_is_over(began))
+            break;
         const auto line = input_.next();
         if (!line) {
             serve_end_of_input();
@@ -179,6 +177,18 @@ bool Connection::serve_lines()
             send(owner_.answer(*this, *line));
     }
     return any;
+}
+
+/// The others are served before what this client has sent besides. By a timer that is due at once:
+/// an event made active from here would come before the loop looks at the other sockets.
+bool Connection::turn_is_over(std::chrono::steady_clock::time_point began)
+{
+    if (std::chrono::steady_clock::now() - began < limits_.turn)
+        return false;
+    const timeval at_once{};
+    event_add(turn_event_.get(), &at_once);
+    waits_for_turn_ = true;
+    return true;
 }
 
 /// Every whole line is answered: what is left to do when no more can come.
@@ -219,12 +229,32 @@ bool Connection::send_event(std::string_view line)
     return !over_;
 }
 
+void Connection::send_report(std::string_view line)
+{
+    if (over_ || finishing_)
+        return;
+    if (waiting() > 0)
+        flush();
+    if (left_out_ > 0 || (waiting() > 0 && waiting() + line.size() > limits_.max_watch_waiting))
+        ++left_out_;
+    else
+        send(line);
+}
+
+void Connection::tell_gap()
+{
+    const std::string line = gap_line(left_out_);
+    left_out_ = 0;
+    send(line);
+}
+
 void Connection::finish_with(std::string_view line)
 {
     if (over_)
         return;
     finishing_ = true;
     pause_reading();
+    drop_input();
     send(line);
 }
 
@@ -241,6 +271,8 @@ void Connection::flush()
         await_writable();
     else if (finishing_)
         end({});
+    else if (left_out_ > 0)
+        tell_gap();
 }
 
 /// A wait that is already under way goes on: sending more to one that does not read must not put
@@ -288,13 +320,33 @@ void Connection::stop_request_timer()
     overdue_ = false;
 }
 
+/// Tells the owner how much memory of others this client takes up.
+void Connection::count_kept()
+{
+    const std::size_t before = kept_;
+    kept_ = input_.rest().size();
+    if (kept_ != before)
+        owner_.keeps(*this, before, kept_);
+}
+
+/// Not while a line is being served: it lies in the input.
+void Connection::drop_input()
+{
+    if (serving_)
+        return;
+    input_.clear();
+    count_kept();
+}
+
 void Connection::end(const std::string &fault)
 {
     if (over_)
         return;
     over_ = true;
     pause_reading();
+    drop_input();
     event_del(write_event_.get());
+    event_del(turn_event_.get());
     ::shutdown(fd_.get(), SHUT_RDWR);
     owner_.ended(*this, fault);
 }

@@ -26,7 +26,16 @@ struct ServerLimits {
     /// disconnects the peer. Large enough that a peer which merely runs later than the daemon does
     /// not lose the events of a large commit.
     std::size_t max_events_waiting = 64UL << 20;
+    /// How many bytes of change reports may wait for a watcher. Those that would go past it are
+    /// left out, and the watcher is told how many.
+    std::size_t max_watch_waiting = 1UL << 20;
+    /// How many bytes of requests that are not served yet all clients together may leave here. Past
+    /// it the client that has left most is turned away.
+    std::size_t max_unserved = 256UL << 20;
     std::size_t max_clients = 512;
+    /// How long one client is served before the others get their turn. A request that has begun is
+    /// always finished.
+    std::chrono::milliseconds turn{10};
     /// A client that has not taken one waiting byte for so long is disconnected, and one that has
     /// begun a request and has not ended it for so long: what is there of it is kept meanwhile.
     std::chrono::milliseconds stall_timeout{30000};
@@ -44,9 +53,12 @@ class Connection
         /// Called once, when the connection is over; `fault` is empty for an ordinary end. The
         /// connection must outlive the call.
         virtual void ended(Connection &connection, const std::string &fault) = 0;
+        /// The bytes of requests that the connection keeps have become `now`, from `before`. The
+        /// owner may end the connection, or another one.
+        virtual void keeps(Connection &connection, std::size_t before, std::size_t now) = 0;
     };
 
-    Connection(EventLoop &loop, UniqueFd fd, std::uint64_t number, const ServerLimits &limits,
+    Connection(EventLoop &loop, UniqueFd fd, ClientInfo client, const ServerLimits &limits,
                Owner &owner);
     Connection(const Connection &) = delete;
     Connection &operator=(const Connection &) = delete;
@@ -54,6 +66,10 @@ class Connection
     /// Sends a line nobody asked for. False when the client has too much waiting or is gone; the
     /// connection is then over.
     bool send_event(std::string_view line);
+
+    /// Sends a line nobody asked for, unless the client has too much waiting: then this line and
+    /// all others are left out until it has read everything, and a line then tells it how many.
+    void send_report(std::string_view line);
 
     /// Sends a last line and ends the connection once it is written. Requests that have not been
     /// answered yet are not.
@@ -64,10 +80,14 @@ class Connection
 
     [[nodiscard]] std::size_t waiting() const { return output_.size(); }
 
+    /// Bytes of requests that are not served yet.
+    [[nodiscard]] std::size_t kept() const { return kept_; }
+
   private:
     static void on_readable(int fd, short what, void *connection);
     static void on_writable(int fd, short what, void *connection);
     static void on_overdue(int fd, short what, void *connection);
+    static void on_next_turn(int fd, short what, void *connection);
 
     void guarded(void (Connection::*step)());
     void read_input();
@@ -77,6 +97,7 @@ class Connection
     void check_request();
     void serve();
     [[nodiscard]] bool serve_lines();
+    [[nodiscard]] bool turn_is_over(std::chrono::steady_clock::time_point began);
     void serve_end_of_input();
     void send(std::string_view line);
     void flush();
@@ -85,6 +106,9 @@ class Connection
     void resume_reading();
     void watch_request(bool begins_anew);
     void stop_request_timer();
+    void tell_gap();
+    void count_kept();
+    void drop_input();
     void end(const std::string &fault);
 
     UniqueFd fd_;
@@ -94,8 +118,12 @@ class Connection
     EventPtr read_event_;
     EventPtr write_event_;
     EventPtr request_timer_;
+    EventPtr turn_event_;
     LineSplitter input_;
     OutputQueue output_;
+    std::size_t kept_ = 0;
+    std::uint64_t left_out_ = 0;
+    bool waits_for_turn_ = false;
     bool end_of_input_ = false;
     bool finishing_ = false;
     bool serving_ = false;

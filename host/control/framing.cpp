@@ -7,10 +7,21 @@ void LineSplitter::feed(std::string_view bytes)
 {
     if (too_long_)
         return;
-    bytes_.erase(0, line_start_);
+    drop_taken();
+    bytes_.append(bytes);
+}
+
+/// Forgets the lines that were handed out. One long line must not leave its memory behind for the
+/// life of a connection.
+void LineSplitter::drop_taken()
+{
+    constexpr std::size_t worth_keeping = 1UL << 17;
+    if (line_start_ == bytes_.size() && bytes_.capacity() > worth_keeping)
+        bytes_ = {};
+    else
+        bytes_.erase(0, line_start_);
     searched_ -= line_start_;
     line_start_ = 0;
-    bytes_.append(bytes);
 }
 
 std::optional<std::string_view> LineSplitter::next()
@@ -26,6 +37,8 @@ std::optional<std::string_view> LineSplitter::next()
     }
     if (newline == std::string::npos) {
         searched_ = end;
+        if (line_start_ == end)
+            drop_taken();
         return std::nullopt;
     }
     const auto line = std::string_view(bytes_).substr(line_start_, end - line_start_);
@@ -38,11 +51,16 @@ std::string_view LineSplitter::rest() const
     return std::string_view(bytes_).substr(line_start_);
 }
 
+void LineSplitter::clear()
+{
+    bytes_ = {};
+    line_start_ = searched_ = 0;
+}
+
 void LineSplitter::give_up()
 {
     too_long_ = true;
-    bytes_ = {};
-    line_start_ = searched_ = 0;
+    clear();
 }
 
 } // namespace ovhost

@@ -29,8 +29,12 @@ class LineSplitter
     /// What came after the last newline: at the end of the stream, a line without one.
     [[nodiscard]] std::string_view rest() const;
 
+    /// Forgets all that came, and with it the memory it took.
+    void clear();
+
   private:
     void give_up();
+    void drop_taken();
 
     std::size_t limit_;
     std::string bytes_;

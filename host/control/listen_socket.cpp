@@ -6,6 +6,7 @@
 #include <sys/file.h>
 #include <sys/socket.h>
 #include <sys/stat.h>
+#include <unistd.h>
 
 #include <cerrno>
 #include <chrono>
@@ -110,9 +111,30 @@ void bind_private(int fd, const std::string &path)
         fail_with_errno(path);
 }
 
+/// By a descriptor of the file itself: in a folder that others may write to, its name could lead
+/// elsewhere by now.
+void give_to_group(const std::string &path, gid_t group)
+{
+    const UniqueFd file(::open(path.c_str(), O_PATH | O_NOFOLLOW | O_CLOEXEC));
+    struct stat status {
+    };
+    if (!file || ::fstat(file.get(), &status) != 0)
+        fail_with_errno(path);
+    if (!S_ISSOCK(status.st_mode) || status.st_uid != ::geteuid())
+        fail(path, "somebody has put something else in its place: choose a folder for --socket "
+                   "that only this user may write to");
+    // The group first: for a moment the other order would let in members of the old one.
+    if (::fchownat(file.get(), "", static_cast<uid_t>(-1), group, AT_EMPTY_PATH) != 0)
+        fail(path, "it cannot be given to group " + std::to_string(group) + ": " +
+                       std::strerror(errno) +
+                       ": choose a --group that this user is a member of, or start as root");
+    if (::chmod(("/proc/self/fd/" + std::to_string(file.get())).c_str(), 0660) != 0)
+        fail_with_errno(path, "changing its permissions: ");
+}
+
 } // namespace
 
-ListenSocket::ListenSocket(std::string path) : path_(std::move(path))
+ListenSocket::ListenSocket(std::string path, std::optional<gid_t> group) : path_(std::move(path))
 {
     // Tells of a path that is too long before anything is touched.
     static_cast<void>(socket_address(path_));
@@ -120,6 +142,8 @@ ListenSocket::ListenSocket(std::string path) : path_(std::move(path))
     remove_stale(path_);
     fd_ = new_socket();
     bind_private(fd_.get(), path_);
+    if (group)
+        give_to_group(path_, *group);
     struct stat status {
     };
     if (::lstat(path_.c_str(), &status) != 0 || ::listen(fd_.get(), SOMAXCONN) != 0)

@@ -5,6 +5,7 @@
 
 #include <sys/types.h>
 
+#include <optional>
 #include <string>
 
 namespace ovhost
@@ -13,11 +14,11 @@ namespace ovhost
 class ListenSocket
 {
   public:
-    /// Binds and listens; the file is readable and writable by its owner alone from the start.
-    /// A socket file nobody listens behind is replaced. Throws std::runtime_error when another
-    /// daemon listens there, when the path is something other than a socket, or when it cannot be
-    /// created.
-    explicit ListenSocket(std::string path);
+    /// Binds and listens; the file is readable and writable by its owner alone, and by `group` when
+    /// there is one: never by more than these, not even for a moment. A socket file nobody listens
+    /// behind is replaced. Throws std::runtime_error when another daemon listens there, when the
+    /// path is something other than a socket, or when it cannot be created or given to the group.
+    explicit ListenSocket(std::string path, std::optional<gid_t> group = std::nullopt);
 
     /// Removes the socket file, unless another one stands there by now.
     ~ListenSocket();

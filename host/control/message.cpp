@@ -1,5 +1,7 @@
 #include "host/control/message.h"
 
+#include "host/support/printable.h"
+
 #include <nlohmann/json.hpp>
 
 namespace ovhost
@@ -47,6 +49,37 @@ std::string fault_of(const json::exception &fault)
     return text;
 }
 
+constexpr std::size_t longest_text = 4096;
+constexpr std::size_t most_details = 200;
+
+/// The beginning of a text that is too long to be read, cut between two characters.
+std::string shortened(std::string text)
+{
+    if (text.size() <= longest_text)
+        return text;
+    std::size_t end = longest_text;
+    while (end > 0 && (static_cast<unsigned char>(text[end]) & 0xc0) == 0x80)
+        --end;
+    const std::string left_out = std::to_string(text.size() - end);
+    text.resize(end);
+    return text + "... (" + left_out + " bytes more)";
+}
+
+std::string more_text(std::size_t count)
+{
+    return "and " + std::to_string(count) + " more";
+}
+
+json detail_json(const ErrorDetail &detail)
+{
+    json row = {{"node", shortened(detail.node)},
+                {"message", shortened(printable(detail.message))},
+                {"module", detail.module}};
+    if (detail.line > 0)
+        row["line"] = detail.line;
+    return row;
+}
+
 } // namespace
 
 std::string to_line(const json &message)
@@ -58,6 +91,9 @@ std::string to_line(const json &message)
 
 json parse_line(std::string_view line)
 {
+    if (const auto at = line.find('\0'); at != std::string_view::npos)
+        throw RequestError(error_code::bad_json,
+                           "not valid JSON: a NUL byte at column " + std::to_string(at + 1));
     if (is_too_deep(line))
         throw RequestError(error_code::bad_json, "not valid here: values are nested deeper than " +
                                                      std::to_string(deepest));
@@ -104,6 +140,11 @@ std::string event_line(const json &event)
     return to_line({{"event", event}});
 }
 
+std::string gap_line(std::uint64_t left_out)
+{
+    return event_line({{"kind", "gap"}, {"left_out", left_out}});
+}
+
 std::string goodbye_line(const std::string &code, const std::string &message)
 {
     return to_line({{"goodbye", {{"code", code}, {"message", message}}}});
@@ -112,13 +153,15 @@ std::string goodbye_line(const std::string &code, const std::string &message)
 json error_to_json(const RequestError &error)
 {
     json details = json::array();
-    for (const ErrorDetail &detail : error.details()) {
-        json row = {{"node", detail.node}, {"message", detail.message}, {"module", detail.module}};
-        if (detail.line > 0)
-            row["line"] = detail.line;
-        details.push_back(std::move(row));
-    }
-    return {{"code", error.code()}, {"message", error.what()}, {"details", std::move(details)}};
+    const std::vector<ErrorDetail> &all = error.details();
+    const std::size_t told = all.size() <= most_details ? all.size() : most_details - 1;
+    for (std::size_t i = 0; i < told; ++i)
+        details.push_back(detail_json(all[i]));
+    if (told < all.size())
+        details.push_back(detail_json({{}, more_text(all.size() - told), {}, 0}));
+    return {{"code", error.code()},
+            {"message", shortened(error.what())},
+            {"details", std::move(details)}};
 }
 
 RequestError error_from_json(const json &error)

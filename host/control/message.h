@@ -6,6 +6,7 @@
 
 #include <nlohmann/json_fwd.hpp>
 
+#include <cstdint>
 #include <string>
 #include <string_view>
 
@@ -25,7 +26,8 @@ inline constexpr const char *stopping = "stopping";
 [[nodiscard]] std::string to_line(const nlohmann::json &message);
 
 /// Reads a line. Throws RequestError "bad-json" that names the fault and where it is; values nested
-/// deeper than 64 are a fault too, because reading them back would exhaust the stack.
+/// deeper than 64 are a fault too, because reading them back would exhaust the stack, and so is a
+/// NUL byte: the parser takes one for the end of the text.
 [[nodiscard]] nlohmann::json parse_line(std::string_view line);
 
 /// Reads a request line and stores its id as soon as that is known, so that the answer to a faulty
@@ -35,9 +37,13 @@ inline constexpr const char *stopping = "stopping";
 [[nodiscard]] std::string result_line(const nlohmann::json &id, const nlohmann::json &result);
 [[nodiscard]] std::string error_line(const nlohmann::json &id, const RequestError &error);
 [[nodiscard]] std::string event_line(const nlohmann::json &event);
+/// Tells a watcher that events were left out, because it did not read them.
+[[nodiscard]] std::string gap_line(std::uint64_t left_out);
 [[nodiscard]] std::string goodbye_line(const std::string &code, const std::string &message);
 
-/// The "error" object of an answer, and back. from_json throws nlohmann::json::exception when the
+/// The "error" object of an answer, and back. What would make it unreadable is cut short: texts are
+/// one line of at most 4096 bytes, and details at most 200, of which the last one then tells how
+/// many more there are. from_json throws nlohmann::json::exception when the
 /// object is not one.
 [[nodiscard]] nlohmann::json error_to_json(const RequestError &error);
 [[nodiscard]] RequestError error_from_json(const nlohmann::json &error);

@@ -31,12 +31,14 @@ inline constexpr const char *bad_value = "bad-value";
 inline constexpr const char *bad_lines = "bad-lines";
 inline constexpr const char *refused = "refused";
 inline constexpr const char *busy = "busy";
+inline constexpr const char *not_allowed = "not-allowed";
 inline constexpr const char *internal = "internal";
 } // namespace error_code
 
 class RequestError : public std::runtime_error
 {
   public:
+    /// `message` becomes one line (printable.h): it may quote what a client has sent.
     RequestError(std::string code, const std::string &message,
                  std::vector<ErrorDetail> details = {});
 

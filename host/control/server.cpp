@@ -2,11 +2,13 @@
 
 #include "host/control/arguments.h"
 #include "host/control/message.h"
+#include "host/support/user_name.h"
 
 #include <event2/event.h>
 #include <event2/listener.h>
 #include <nlohmann/json.hpp>
 
+#include <algorithm>
 #include <cerrno>
 #include <cstring>
 #include <stdexcept>
@@ -26,6 +28,16 @@ std::string describe(const ClientInfo &client)
     if (!client.peer.empty())
         text += ", peer " + client.peer;
     return text + ")";
+}
+
+ClientInfo describe(const PeerCredentials &peer, std::uint64_t number)
+{
+    return {.number = number,
+            .pid = peer.pid,
+            .uid = peer.uid,
+            .gid = peer.gid,
+            .user = user_name(peer.uid),
+            .peer = {}};
 }
 
 void check_peer_name(const std::string &name)
@@ -48,8 +60,10 @@ void ControlServer::ListenerDeleter::operator()(evconnlistener *listener) const
 }
 
 ControlServer::ControlServer(EventLoop &loop, const std::string &socket_path,
-                             const ServerLimits &limits, RequestHandler &handler, ControlLog log)
-    : loop_(loop), limits_(limits), handler_(handler), log_(std::move(log)), socket_(socket_path),
+                             const ServerLimits &limits, RequestHandler &handler, ControlLog log,
+                             AccessPolicy access)
+    : loop_(loop), limits_(limits), handler_(handler), log_(std::move(log)),
+      access_(std::move(access)), socket_(socket_path, access_.group()),
       reap_event_(event_new(loop.base(), -1, 0, on_reap, this)),
       retry_accept_event_(evtimer_new(loop.base(), on_retry_accept, this)),
       // Backlog 0: the socket listens already.
@@ -69,6 +83,9 @@ ControlServer::~ControlServer()
     const auto peers = peers_;
     for (const auto &[name, peer] : peers)
         peer.connection->finish_with(line);
+    const auto watchers = watchers_;
+    for (const auto &[number, watcher] : watchers)
+        watcher->finish_with(line);
 }
 
 void ControlServer::on_accept(evconnlistener *, int fd, sockaddr *, int, void *server)
@@ -107,19 +124,47 @@ void ControlServer::on_reap(int, short, void *server)
 void ControlServer::accept(UniqueFd fd)
 {
     const std::uint64_t number = next_number_++;
+    const PeerCredentials peer = credentials_of(fd.get());
     Connection::Owner &owner = *this;
-    auto connection = std::make_unique<Connection>(loop_, std::move(fd), number, limits_, owner);
+    auto connection =
+        std::make_unique<Connection>(loop_, std::move(fd), describe(peer, number), limits_, owner);
     Connection &added = *connection;
     const bool full = connections_.size() >= limits_.max_clients;
     connections_.emplace(number, std::move(connection));
     log_(ControlLogLevel::debug, describe(added.client()) + " connected");
-    if (!full)
-        return;
-    const std::string reason =
-        std::to_string(limits_.max_clients) + " clients are connected, no more are taken";
-    log_(ControlLogLevel::warning, describe(added.client()) + " turned away: " + reason);
-    added.finish_with(
-        error_line(nullptr, RequestError(error_code::busy, reason + ": try again later")));
+    if (!access_.allows(peer))
+        turn_away(added, error_code::not_allowed,
+                  "user " + added.client().user + " may not use this socket",
+                  "be mgmtd's user, root, or a member of the group that mgmtd --group names");
+    else if (full)
+        turn_away(added, error_code::busy,
+                  std::to_string(limits_.max_clients) + " clients are connected, no more are taken",
+                  "try again later");
+}
+
+void ControlServer::turn_away(Connection &connection, const char *code, const std::string &reason,
+                              const char *advice)
+{
+    log_(ControlLogLevel::warning, describe(connection.client()) + " turned away: " + reason);
+    connection.finish_with(error_line(nullptr, RequestError(code, reason + ": " + advice)));
+}
+
+void ControlServer::keeps(Connection &, std::size_t before, std::size_t now)
+{
+    unserved_ = unserved_ - before + now;
+    if (now > before && unserved_ > limits_.max_unserved)
+        turn_away_largest();
+}
+
+/// The one that has left most, since the others have the better claim to what there is.
+void ControlServer::turn_away_largest()
+{
+    const auto largest = std::ranges::max_element(
+        connections_, {}, [](const auto &entry) { return entry.second->kept(); });
+    turn_away(*largest->second, error_code::busy,
+              "requests that are not complete take up " + std::to_string(unserved_) +
+                  " bytes, no more than " + std::to_string(limits_.max_unserved) + " may",
+              "try again later");
 }
 
 std::string ControlServer::answer(Connection &from, std::string_view line)
@@ -141,6 +186,10 @@ json ControlServer::dispatch(Connection &from, const json &request)
 {
     if (request.at("command") == "hello")
         return hello(from, request);
+    if (request.at("command") == "watch") {
+        watchers_[from.client().number] = &from;
+        return json::object();
+    }
     return handler_.handle(request, from.client());
 }
 
@@ -176,6 +225,7 @@ json ControlServer::hello(Connection &from, const json &request)
 void ControlServer::ended(Connection &connection, const std::string &fault)
 {
     const ClientInfo &client = connection.client();
+    watchers_.erase(client.number);
     if (const auto peer = peers_.find(client.peer);
         peer != peers_.end() && peer->second.connection == &connection) {
         peers_.erase(peer);
@@ -201,6 +251,15 @@ bool ControlServer::send_to_peer(const std::string &name, const json &event)
     // Counted before: when sending ends the peer, its entry is gone afterwards.
     ++peer->second.events_sent;
     return peer->second.connection->send_event(event_line(event));
+}
+
+void ControlServer::report(const json &event)
+{
+    const std::string line = event_line(event);
+    // Sending may end a watcher and take it out of the map.
+    const auto watchers = watchers_;
+    for (const auto &[number, watcher] : watchers)
+        watcher->send_report(line);
 }
 
 std::vector<PeerStatus> ControlServer::peers() const

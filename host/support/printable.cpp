@@ -25,17 +25,26 @@ std::string escaped(unsigned char character)
     return code;
 }
 
+/// Whether a control character beyond ASCII, U+0080 to U+009F, begins at `at`.
+bool is_wide_control(std::string_view text, std::size_t at)
+{
+    return text[at] == '\xc2' && at + 1 < text.size() &&
+           (static_cast<unsigned char>(text[at + 1]) & 0xe0) == 0x80;
+}
+
 } // namespace
 
 std::string printable(std::string_view text)
 {
     std::string result;
-    for (const char character : text) {
-        const auto byte = static_cast<unsigned char>(character);
-        if (byte < 0x20 || byte == 0x7f)
+    for (std::size_t at = 0; at < text.size(); ++at) {
+        const auto byte = static_cast<unsigned char>(text[at]);
+        if (is_wide_control(text, at))
+            result += "\\u00" + escaped(static_cast<unsigned char>(text[++at])).substr(2);
+        else if (byte < 0x20 || byte == 0x7f)
             result += escaped(byte);
         else
-            result += character;
+            result += text[at];
     }
     return result;
 }

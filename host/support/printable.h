@@ -7,8 +7,8 @@
 namespace ovhost
 {
 
-/// Control characters as \n, \t, \r or \xNN, so that a value is one line and cannot steer the
-/// terminal. Everything else stays as it is.
+/// Control characters as \n, \t, \r or \xNN, those beyond ASCII as \u00NN, so that a value is one
+/// line and cannot steer the terminal. Everything else stays as it is.
 [[nodiscard]] std::string printable(std::string_view text);
 
 } // namespace ovhost

@@ -234,7 +234,7 @@ TEST(ClientTest, TheReasonOfAGoodbyeIsTold)
     server.stop();
     const Fault stopped =
         fault_of([&] { static_cast<void>(second.read_event(milliseconds(10000))); });
-    EXPECT_EQ(stopped.kind, Kind::closed);
+    EXPECT_EQ(stopped.kind, Kind::stopping);
     EXPECT_EQ(stopped.message, "mgmtd closed the connection: mgmtd is stopping");
 }
 

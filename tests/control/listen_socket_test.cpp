@@ -8,6 +8,7 @@
 #include <gtest/gtest.h>
 #include <sys/socket.h>
 #include <sys/stat.h>
+#include <unistd.h>
 
 #include <filesystem>
 #include <string>
@@ -60,6 +61,23 @@ TEST_F(ListenSocketTest, OnlyTheOwnerMayUseIt)
         EXPECT_EQ(status.st_mode, static_cast<mode_t>(S_IFSOCK | 0600));
     }
     EXPECT_EQ(::umask(before), 0U) << "the umask was not put back";
+}
+
+TEST_F(ListenSocketTest, AGroupMayUseItToo)
+{
+    // Root can give it to any group, another user to its own.
+    const gid_t group = ::geteuid() == 0 ? 65534 : ::getegid();
+    const ListenSocket socket(path_, group);
+    struct stat status {
+    };
+    ASSERT_EQ(::stat(path_.c_str(), &status), 0);
+    EXPECT_EQ(status.st_mode, static_cast<mode_t>(S_IFSOCK | 0660));
+    EXPECT_EQ(status.st_gid, group);
+    EXPECT_EQ(status.st_uid, ::geteuid());
+    const UniqueFd client = new_socket();
+    const sockaddr_un address = socket_address(path_);
+    EXPECT_EQ(
+        ::connect(client.get(), reinterpret_cast<const sockaddr *>(&address), sizeof(address)), 0);
 }
 
 TEST_F(ListenSocketTest, TheFileGoesWithTheSocket)

@@ -7,6 +7,7 @@
 
 #include <optional>
 #include <string>
+#include <vector>
 
 namespace ovhost
 {
@@ -48,6 +49,54 @@ TEST(MessageTest, ARequestMayGoWithoutAnId)
     EXPECT_TRUE(id.is_null());
     EXPECT_EQ(parse_request(R"({"id":null,"command":"check"})", id).at("command"), "check");
     EXPECT_TRUE(id.is_null());
+}
+
+TEST(MessageTest, ANulByteIsAFaultWhereverItStands)
+{
+    const std::string request = R"({"id":1,"command":"x"})";
+    for (const std::size_t at : {std::size_t{0}, std::size_t{5}, request.size()}) {
+        std::string line = request;
+        line.insert(at, 1, '\0');
+        const Fault fault = fault_of(line);
+        EXPECT_EQ(fault.code, "bad-json");
+        EXPECT_EQ(fault.message, "not valid JSON: a NUL byte at column " + std::to_string(at + 1));
+    }
+    json id;
+    EXPECT_EQ(parse_request(R"({"command":"a\u0000b"})", id).at("command"), std::string("a\0b", 3))
+        << "an escaped one is a character of the text";
+}
+
+TEST(MessageTest, ATextOfAnErrorIsOneLineThatCanBeRead)
+{
+    const json error = error_to_json(RequestError(
+        error_code::refused, std::string("no\n\0\x1b[31m\xc2\x9b!", 12), {{"/a", "b\tc", "m", 0}}));
+    EXPECT_EQ(error.at("message"), "no\\n\\x00\\x1b[31m\\u009b!");
+    EXPECT_EQ(error.at("details").at(0).at("message"), "b\\tc");
+}
+
+TEST(MessageTest, ATextOfAnErrorThatIsTooLongIsCutBetweenCharacters)
+{
+    const std::string most(4096, 'x');
+    EXPECT_EQ(error_to_json(RequestError("c", most)).at("message"), most);
+    const std::string cut(4095, 'x');
+    // The last character that fits begins at byte 4095 and would end behind the limit.
+    EXPECT_EQ(
+        error_to_json(RequestError("c", cut + "\xc3\xa9yz", {{"/n", cut + "\xc3\xa9", "m", 0}})),
+        (json{{"code", "c"},
+              {"message", cut + "... (4 bytes more)"},
+              {"details",
+               {{{"node", "/n"}, {"message", cut + "... (2 bytes more)"}, {"module", "m"}}}}}));
+}
+
+TEST(MessageTest, ManyDetailsAreSummedUp)
+{
+    const std::vector<ErrorDetail> most(200, {"/a", "bad", "m", 1});
+    EXPECT_EQ(error_to_json(RequestError("c", "m", most)).at("details").size(), 200U);
+    const std::vector<ErrorDetail> more(201, {"/a", "bad", "m", 1});
+    const json details = error_to_json(RequestError("c", "m", more)).at("details");
+    ASSERT_EQ(details.size(), 200U);
+    EXPECT_EQ(details.at(198).at("message"), "bad");
+    EXPECT_EQ(details.at(199), (json{{"node", ""}, {"message", "and 2 more"}, {"module", ""}}));
 }
 
 TEST(MessageTest, MalformedJsonIsNamedWithItsPlace)

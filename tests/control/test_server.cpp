@@ -18,16 +18,18 @@ json echo(const json &request, const ClientInfo &)
 
 } // namespace
 
-TestServer::TestServer(Handler handler, ServerLimits limits, std::string path)
+TestServer::TestServer(Handler handler, ServerLimits limits, std::string path, AccessPolicy access)
     : path_(path.empty() ? dir_.path("socket") : std::move(path)),
       handler_(handler ? std::move(handler) : echo)
 {
     RequestHandler &behind = *this;
-    server_ = std::make_unique<ControlServer>(loop_, path_, limits, behind,
-                                              [this](ControlLogLevel, const std::string &text) {
-                                                  const std::lock_guard lock(log_mutex_);
-                                                  log_.push_back(text);
-                                              });
+    server_ = std::make_unique<ControlServer>(
+        loop_, path_, limits, behind,
+        [this](ControlLogLevel, const std::string &text) {
+            const std::lock_guard lock(log_mutex_);
+            log_.push_back(text);
+        },
+        std::move(access));
     thread_ = std::thread([this] { loop_.run(); });
 }
 

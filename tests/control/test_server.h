@@ -26,7 +26,8 @@ class TestServer : private RequestHandler
 
     /// Without a handler: "echo" answers with the request's "text", anything else is refused as an
     /// unknown command.
-    explicit TestServer(Handler handler = {}, ServerLimits limits = {}, std::string path = {});
+    explicit TestServer(Handler handler = {}, ServerLimits limits = {}, std::string path = {},
+                        AccessPolicy access = AccessPolicy());
     ~TestServer() override;
 
     [[nodiscard]] const std::string &path() const { return path_; }

@@ -1,0 +1,157 @@
+// Many clients at once, some of them greedy: everyone gets the right answers and nobody waits for
+// long. host/control/connection.h is what shares the daemon out.
+
+#include "host/control/client.h"
+#include "tests/control/raw_client.h"
+#include "tests/control/test_server.h"
+
+#include <gtest/gtest.h>
+
+#include <algorithm>
+#include <atomic>
+#include <chrono>
+#include <latch>
+#include <memory>
+#include <string>
+#include <thread>
+#include <vector>
+
+namespace ovhost
+{
+namespace
+{
+
+using nlohmann::json;
+using std::chrono::milliseconds;
+using std::chrono::steady_clock;
+using test::RawClient;
+using test::TestServer;
+
+constexpr int clients = 100;
+constexpr int requests_each = 50;
+
+/// What one client of the crowd has seen.
+struct Record {
+    int right = 0;
+    steady_clock::duration longest_wait{};
+};
+
+void ask_on_and_on(const std::string &path, int number, std::latch &all_connected, Record &record)
+{
+    ControlClient client(path, std::chrono::seconds(60));
+    all_connected.arrive_and_wait();
+    for (int i = 0; i < requests_each; ++i) {
+        const std::string text = std::to_string(number) + "/" + std::to_string(i);
+        const auto began = steady_clock::now();
+        const json result = client.call("echo", {{"text", text}});
+        record.longest_wait = std::max(record.longest_wait, steady_clock::now() - began);
+        record.right += result.at("text") == text ? 1 : 0;
+    }
+}
+
+TEST(CrowdTest, AHundredClientsAskAtOnceAndEachGetsItsOwnAnswers)
+{
+    TestServer server;
+    std::latch all_connected(clients);
+    std::vector<Record> records(clients);
+    std::vector<std::jthread> threads;
+    for (int i = 0; i < clients; ++i)
+        threads.emplace_back([&, i] {
+            ask_on_and_on(server.path(), i, all_connected, records[static_cast<std::size_t>(i)]);
+        });
+    threads.clear();
+    for (const Record &record : records) {
+        EXPECT_EQ(record.right, requests_each);
+        EXPECT_LT(record.longest_wait, std::chrono::seconds(5));
+    }
+}
+
+TEST(CrowdTest, OneThatAsksWithoutEndDoesNotKeepTheOthersWaiting)
+{
+    constexpr int greedy_requests = 400;
+    std::atomic<int> handled = 0;
+    TestServer server([&](const json &request, const ClientInfo &) -> json {
+        if (request.at("command") == "echo")
+            return {{"handled", handled.load()}};
+        std::this_thread::sleep_for(milliseconds(5));
+        ++handled;
+        return json::object();
+    });
+    // All in one piece: two seconds of work.
+    RawClient greedy(server.path());
+    std::string all;
+    for (int i = 0; i < greedy_requests; ++i)
+        all += "{\"id\":" + std::to_string(i) + ",\"command\":\"work\"}\n";
+    ASSERT_TRUE(greedy.send(all));
+
+    ControlClient other(server.path());
+    int before = 0;
+    for (int i = 0; i < 10; ++i) {
+        const int now = other.call("echo").at("handled").get<int>();
+        EXPECT_LT(now, greedy_requests) << "the other one waited until the greedy one was done";
+        EXPECT_LT(now - before, 100) << "the other one waited for many turns";
+        before = now;
+    }
+    for (int i = 0; i < greedy_requests; ++i)
+        ASSERT_EQ(greedy.line(), "{\"id\":" + std::to_string(i) + ",\"ok\":true,\"result\":{}}");
+}
+
+TEST(CrowdTest, OneThatIsServedInTurnsGetsAllItsAnswersAfterTheEndOfItsInput)
+{
+    TestServer server(
+        [](const json &, const ClientInfo &) -> json {
+            std::this_thread::sleep_for(milliseconds(1));
+            return json::object();
+        },
+        {.turn = milliseconds(0)});
+    RawClient client(server.path());
+    for (int i = 0; i < 20; ++i)
+        client.send("{\"id\":" + std::to_string(i) + ",\"command\":\"work\"}\n");
+    client.send("{\"id\":20,\"command\":\"work\"}");
+    client.shut_down_writing();
+    for (int i = 0; i <= 20; ++i)
+        EXPECT_EQ(client.line(), "{\"id\":" + std::to_string(i) + ",\"ok\":true,\"result\":{}}");
+    EXPECT_EQ(client.line(), "<end>");
+}
+
+TEST(CrowdTest, UnfinishedRequestsTogetherHaveABound)
+{
+    TestServer server({}, {.max_unserved = 3000000});
+    const std::string head = R"({"id":1,"command":"echo","text":")";
+    RawClient modest(server.path());
+    ASSERT_TRUE(modest.send(head + std::string(1000000, 'x')));
+    // The second one is the larger one when the bound is passed.
+    RawClient greedy(server.path());
+    greedy.send(head + std::string(2500000, 'y'));
+    const std::string refusal = greedy.line();
+    EXPECT_NE(refusal.find(R"("code":"busy")"), std::string::npos) << refusal;
+    EXPECT_NE(refusal.find("no more than 3000000 may: try again later"), std::string::npos)
+        << refusal;
+    EXPECT_EQ(greedy.line(), "<end>");
+
+    ASSERT_TRUE(modest.send("\"}\n"));
+    EXPECT_EQ(modest.line().size(),
+              std::string(R"({"id":1,"ok":true,"result":{"text":""}})").size() + 1000000);
+    // What both of them had left is free again.
+    RawClient later(server.path());
+    ASSERT_TRUE(later.send(head + std::string(2900000, 'z') + "\"}\n"));
+    EXPECT_NE(later.line().find(R"("ok":true)"), std::string::npos);
+    EXPECT_EQ(server.logged("turned away").size(), 1U);
+}
+
+TEST(CrowdTest, ClientsThatLeaveUnfinishedRequestsBehindAreForgotten)
+{
+    TestServer server({}, {.max_unserved = 3000000});
+    const std::string head = R"({"id":1,"command":"echo","text":")";
+    for (int i = 0; i < 20; ++i) {
+        RawClient client(server.path());
+        ASSERT_TRUE(client.send(head + std::string(1000000, 'x')));
+        client.shut_down_writing();
+        ASSERT_NE(client.line().find("bad-json"), std::string::npos);
+        ASSERT_EQ(client.line(), "<end>");
+    }
+    EXPECT_TRUE(server.logged("turned away").empty());
+}
+
+} // namespace
+} // namespace ovhost
