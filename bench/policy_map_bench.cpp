@@ -1,0 +1,500 @@
+// What the library adds to the host's work for policy maps: the checks of a commit, and the upgrade
+// of maps of the older form. Each stands beside the host operations that the same work cannot do
+// without, called one after the other with all names at hand.
+
+#include "bench/goals.h"
+#include "bench/policy_maps.h"
+#include "framework/addresses.h"
+#include "framework/logging.h"
+#include "host/tree/diff.h"
+#include "orvale/md_xmap_common.h"
+
+#include <array>
+#include <map>
+#include <memory>
+#include <string>
+#include <vector>
+
+namespace
+{
+
+using namespace ovbench;
+
+constexpr char entry_pattern[] = "/ov/tunneld/route_map/config/map/*/prio/*";
+
+bool matches(const NodeChange &change, const char *pattern)
+{
+    return bn_binding_name_parts_pattern_match(change.parts(), true, pattern);
+}
+
+/// The names of a node's children, which nobody looks at.
+int list(md_commit *commit, const mdb_db &db, const std::string &node)
+{
+    OwnedStrings names;
+    const int status = mdb_get_tstr_array(commit, &db, node.c_str(), 0, 0, 0, names.out());
+    benchmark::DoNotOptimize(names.get());
+    return status;
+}
+
+/// The same data for all repetitions of a size.
+template <typename Data>
+Data &of_size(const benchmark::State &state)
+{
+    static std::map<int64_t, std::unique_ptr<Data>> made;
+    std::unique_ptr<Data> &data = made[state.range(0)];
+    if (data == nullptr) {
+        data = std::make_unique<Data>(static_cast<int>(state.range(0)));
+    }
+    return *data;
+}
+
+/// Entries that all match by one ACL, as they are before a commit.
+struct ReferringMaps {
+    explicit ReferringMaps(int num_entries) : names(entry_names(num_entries))
+    {
+        for (const EntryName &name : names) {
+            set(db, name.node() + "/match/0/acl", bt_string, "office");
+            set(db, name.node() + "/set/0/nexthop", bt_ipv4addr, "10.0.0.1");
+            set(db, name.reference("office"), bt_uint32, name.priority);
+        }
+    }
+
+    std::vector<EntryName> names;
+    mdb_db db;
+};
+
+/// One more entry.
+struct EntryAddition {
+    explicit EntryAddition(int num_entries) : maps(num_entries)
+    {
+        for (int map = 0; map < num_maps; ++map) {
+            prio_nodes.push_back(std::string(route_root) + "/branch-office-" + std::to_string(map) +
+                                 "/prio");
+        }
+        dbinfo = {.commit = &commit, .olddb = &maps.db, .newdb = &maps.db};
+    }
+
+    [[nodiscard]] int check()
+    {
+        tbool to_bail = false;
+        const int status =
+            md_xmap_common_change_check(change.record(), &dbinfo, MAP_TYPE_R, &to_bail);
+        return to_bail ? MD_XMAP_REFUSED : status;
+    }
+
+    /// Whether the change is a map or an entry, how many entries there are, and whether it is a
+    /// match string or sets something.
+    [[nodiscard]] int query()
+    {
+        int status = matches(change, "/ov/tunneld/route_map/config/map/*") ? -1 : 0;
+        status |= matches(change, entry_pattern) ? 0 : -1;
+        status |= list(&commit, maps.db, route_root);
+        for (const std::string &node : prio_nodes) {
+            status |= list(&commit, maps.db, node);
+        }
+        status |= matches(change, "/ov/tunneld/route_map/config/map/*/prio/*/match/*/matchstr");
+        status |= matches(change, "/ov/tunneld/route_map/config/map/*/prio/*/set/*");
+        return status;
+    }
+
+    ReferringMaps maps;
+    std::vector<std::string> prio_nodes;
+    CountingCommit commit;
+    md_dbinfo dbinfo;
+    NodeChange change{mdct_add, std::string(route_root) + "/branch-office-0/prio/7", nullptr};
+};
+
+/// An entry of each map gets another ACL.
+struct AclChanges {
+    struct Change {
+        explicit Change(const EntryName &name)
+            : record(mdct_modify, name.node() + "/match/0/acl", "branch"), priority(name.priority),
+              acl(name.node() + "/match/0/acl"), added(name.reference("branch")),
+              removed(name.reference("office")), references(removed.substr(0, removed.rfind('/')))
+        {
+        }
+
+        NodeChange record;
+        std::string priority;
+        std::string acl;
+        std::string added;
+        std::string removed;
+        std::string references;
+    };
+
+    explicit AclChanges(int num_entries) : maps(num_entries)
+    {
+        const auto per_map = static_cast<std::size_t>(num_entries / num_maps);
+        for (std::size_t map = 0; map < num_maps; ++map) {
+            changes.emplace_back(std::make_unique<Change>(maps.names[map * per_map + per_map / 2]));
+        }
+        proposed = maps.db;
+        for (const auto &change : changes) {
+            set(proposed, change->acl, bt_string, "branch");
+        }
+        newdb.writable = true;
+        begin();
+        dbinfo = {.commit = &commit, .olddb = &maps.db, .newdb = &newdb};
+    }
+
+    /// The proposed database is as it is before the references are looked after.
+    void begin() { newdb.tree = proposed.tree; }
+
+    [[nodiscard]] int process()
+    {
+        int status = 0;
+        for (const auto &change : changes) {
+            status |= md_acl_ref_processing(change->record.record(), &dbinfo, MAP_TYPE_R);
+        }
+        return status;
+    }
+
+    [[nodiscard]] int query()
+    {
+        int status = 0;
+        for (const auto &change : changes) {
+            status |= query(*change);
+        }
+        return status;
+    }
+
+    [[nodiscard]] int query(Change &change)
+    {
+        int status = matches(change.record, "/ov/tunneld/route_map/config/map/*/prio/*/match/*/acl")
+                         ? 0
+                         : -1;
+        OwnedString new_acl;
+        status |= bn_attrib_array_get_attrib_tstr(change.record.record()->mdc_new_attribs, ba_value,
+                                                  new_acl.out());
+        OwnedBinding old_binding;
+        OwnedText old_acl;
+        status |= mdb_get_node_binding(&commit, &maps.db, change.acl.c_str(), 0, old_binding.out());
+        status |= bn_binding_get_str(old_binding.get(), ba_value, bt_string, 0, old_acl.out());
+        OwnedBinding added;
+        status |= bn_binding_new_str(added.out(), change.added.c_str(), ba_value, bt_uint32, 0,
+                                     change.priority.c_str());
+        status |= mdb_set_node_binding(&commit, &newdb, bsso_modify, 0, added.get());
+        status |= list(&commit, newdb, change.references);
+        OwnedBinding removed;
+        status |= bn_binding_new_named(removed.out(), change.removed.c_str());
+        status |= mdb_set_node_binding(&commit, &newdb, bsso_delete, 0, removed.get());
+        return status;
+    }
+
+    ReferringMaps maps;
+    std::vector<std::unique_ptr<Change>> changes;
+    mdb_db proposed;
+    mdb_db newdb;
+    CountingCommit commit;
+    md_dbinfo dbinfo;
+};
+
+/// An ACL goes, and none of the entries that refer to it names it any more.
+struct AclRemoval {
+    explicit AclRemoval(int num_entries) : maps(num_entries)
+    {
+        for (const EntryName &name : maps.names) {
+            acl_nodes.push_back(name.node() + "/match/0/acl");
+            set(newdb, acl_nodes.back(), bt_string, "branch");
+        }
+        dbinfo = {.commit = &commit, .olddb = &maps.db, .newdb = &newdb};
+    }
+
+    [[nodiscard]] int guard()
+    {
+        const int status = md_acl_not_used_in_map(change.record(), &dbinfo, MAP_TYPE_R);
+        return commit.refusals == 0 ? status : MD_XMAP_REFUSED;
+    }
+
+    [[nodiscard]] int query()
+    {
+        int status = matches(change, "/ov/tunneld/acl/config/*") ? 0 : -1;
+        OwnedStrings references;
+        status |= mdb_get_matching_tstr_array(
+            &commit, &maps.db, "/ov/tunneld/acl/config/office/rmap/*/prio/*",
+            mdqf_sel_iterate_subtree | mdqf_sel_class_no_state, references.out());
+        for (uint32 i = 0; i < acl_nodes.size(); ++i) {
+            OwnedStrings parts;
+            status |= bn_binding_name_to_parts(tstr_array_get_str_quick(references.get(), i),
+                                               parts.out(), false);
+            OwnedString acl;
+            status |= mdb_get_node_value_tstr(&commit, &newdb, acl_nodes[i].c_str(), 0, nullptr,
+                                              acl.out());
+            status |= ts_cmp_str(acl.get(), "office", false) == 0 ? -1 : 0;
+        }
+        return status;
+    }
+
+    ReferringMaps maps;
+    std::vector<std::string> acl_nodes;
+    mdb_db newdb;
+    CountingCommit commit;
+    md_dbinfo dbinfo;
+    NodeChange change{mdct_delete, "/ov/tunneld/acl/config/office", nullptr};
+};
+
+/// What an entry of the older form holds, in the order in which it is taken apart.
+struct LegacyField {
+    const char *node;
+    const char *value; ///< null: absent
+    bool is_read;
+};
+
+constexpr std::array<LegacyField, 13> legacy_fields = {{
+    {"application", "web", true},
+    {"ipver", "ipv4", true},
+    {"source/addr/ipv6/static/ipv6prefix", nullptr, false},
+    {"dest/addr/ipv6/static/ipv6prefix", nullptr, false},
+    {"source/addr/ipv4/static/ipaddr", "10.1.0.0", true},
+    {"source/addr/ipv4/static/mask_len", "255.255.0.0", true},
+    {"dest/addr/ipv4/static/ipaddr", "10.2.3.0", true},
+    {"dest/addr/ipv4/static/mask_len", "24", true},
+    {"src/port", "0", true},
+    {"dest/port", "443", true},
+    {"vlan", "any", true},
+    {"protocol", "tcp", true},
+    {"dscp", "any", true},
+}};
+
+constexpr char match_string[] = "application:web,src_ip:10.1.0.0/16,dst_ip:10.2.3.0/24,"
+                                "dst_port:443,protocol:tcp";
+
+/// Entries of the older form.
+struct LegacyMaps {
+    explicit LegacyMaps(int num_entries)
+    {
+        for (const EntryName &name : entry_names(num_entries)) {
+            const std::string match_node = name.node() + "/match/0/";
+            Entry entry = {match_node + "acl", {}, match_node + "matchstr"};
+            for (std::size_t i = 0; i < legacy_fields.size(); ++i) {
+                entry.fields[i] = match_node + legacy_fields[i].node;
+                if (legacy_fields[i].value != nullptr) {
+                    set(db, entry.fields[i], bt_string, legacy_fields[i].value);
+                }
+            }
+            entries.push_back(std::move(entry));
+        }
+        for (int map = 0; map < num_maps; ++map) {
+            prio_nodes.push_back(std::string(route_root) + "/branch-office-" + std::to_string(map) +
+                                 "/prio");
+        }
+        newdb.writable = true;
+        begin();
+    }
+
+    void begin() { newdb.tree = db.tree; }
+
+    [[nodiscard]] int upgrade()
+    {
+        return md_xmap_upgrade_to_pattern_match(&newdb, &db, MAP_TYPE_R);
+    }
+
+    [[nodiscard]] int query()
+    {
+        int status = list(nullptr, db, route_root);
+        for (const std::string &node : prio_nodes) {
+            status |= list(nullptr, db, node);
+        }
+        for (const Entry &entry : entries) {
+            status |= query(entry);
+        }
+        return status;
+    }
+
+    struct Entry {
+        std::string acl;
+        std::array<std::string, legacy_fields.size()> fields;
+        std::string match_string;
+    };
+
+    [[nodiscard]] int query(const Entry &entry)
+    {
+        int status = read(entry.acl);
+        for (std::size_t i = 0; i < legacy_fields.size(); ++i) {
+            if (legacy_fields[i].is_read) {
+                status |= read(entry.fields[i]);
+            }
+            OwnedBinding field;
+            status |=
+                mdb_get_node_binding(nullptr, &newdb, entry.fields[i].c_str(), 0, field.out());
+            if (field.get() != nullptr) {
+                status |= mdb_set_node_binding(nullptr, &newdb, bsso_delete, 0, field.get());
+            }
+        }
+        for (const char *mask : {"255.255.0.0", "24"}) {
+            OwnedText length;
+            status |= lc_mask_or_masklen_to_masklen_str(mask, length.out());
+        }
+        OwnedBinding made;
+        status |= bn_binding_new_str(made.out(), entry.match_string.c_str(), ba_value, bt_string, 0,
+                                     match_string);
+        return status | mdb_set_node_binding(nullptr, &newdb, bsso_modify, 0, made.get());
+    }
+
+    [[nodiscard]] int read(const std::string &node) const
+    {
+        OwnedString value;
+        const int status =
+            mdb_get_node_value_tstr(nullptr, &db, node.c_str(), 0, nullptr, value.out());
+        benchmark::DoNotOptimize(value.get());
+        return status;
+    }
+
+    mdb_db db;
+    mdb_db newdb;
+    std::vector<Entry> entries;
+    std::vector<std::string> prio_nodes;
+};
+
+/// Work that leaves everything as it was.
+template <typename Data, int (Data::*work)()>
+void repeat(benchmark::State &state)
+{
+    Data &data = of_size<Data>(state);
+    for (auto _ : state) {
+        if ((data.*work)() != 0) {
+            state.SkipWithError("the work failed");
+        }
+    }
+}
+
+/// Work that begins on another database each time.
+template <typename Data, int (Data::*work)()>
+void repeat_anew(benchmark::State &state)
+{
+    Data &data = of_size<Data>(state);
+    for (auto _ : state) {
+        state.PauseTiming();
+        data.begin();
+        state.ResumeTiming();
+        if ((data.*work)() != 0) {
+            state.SkipWithError("the work failed");
+        }
+    }
+    data.begin();
+}
+
+/// Both roads lead to the same database.
+template <typename Data, int (Data::*work)(), int (Data::*queries)()>
+void require_same_end(int num_entries)
+{
+    Data data(num_entries);
+    const ovhost::Tree start = data.newdb.tree;
+    require((data.*work)() == 0, "the work failed");
+    const ovhost::Tree end = data.newdb.tree;
+    data.begin();
+    require((data.*queries)() == 0, "the queries failed");
+    require(!ovhost::diff(start, end).empty(), "nothing was done");
+    require(ovhost::diff(end, data.newdb.tree).empty(), "the queries do not do the same");
+}
+
+void require_same_ends()
+{
+    for (const int num_entries : {10, 1'000}) {
+        require_same_end<AclChanges, &AclChanges::process, &AclChanges::query>(num_entries);
+        require_same_end<LegacyMaps, &LegacyMaps::upgrade, &LegacyMaps::query>(num_entries);
+    }
+}
+
+struct Size {
+    int num_entries;
+    const char *label;
+};
+
+constexpr Size sizes[] = {{10, "10"}, {1'000, "1,000"}, {10'000, "10,000"}};
+
+/// One kind of work: its benches are named by `name`, and "NAME_bare" is of the queries alone.
+struct Work {
+    const char *name;
+    const char *label;
+    void (*library)(benchmark::State &);
+    void (*bare)(benchmark::State &);
+};
+
+constexpr Work works[] = {
+    {"check", "common change check of a new entry", repeat<EntryAddition, &EntryAddition::check>,
+     repeat<EntryAddition, &EntryAddition::query>},
+    {"references", "reference processing of 10 changed ACLs",
+     repeat_anew<AclChanges, &AclChanges::process>, repeat_anew<AclChanges, &AclChanges::query>},
+    {"guard", "deletion guard of an ACL", repeat<AclRemoval, &AclRemoval::guard>,
+     repeat<AclRemoval, &AclRemoval::query>},
+    {"upgrade", "upgrade of all entries", repeat_anew<LegacyMaps, &LegacyMaps::upgrade>,
+     repeat_anew<LegacyMaps, &LegacyMaps::query>},
+};
+
+std::string bench_name(const Work &work, const Size &size)
+{
+    return std::string(work.name) + '/' + std::to_string(size.num_entries);
+}
+
+std::string bare_name(const Work &work, const Size &size)
+{
+    return std::string(work.name) + "_bare/" + std::to_string(size.num_entries);
+}
+
+void add_bench(const std::string &name, void (*run)(benchmark::State &))
+{
+    auto *const bench = benchmark::RegisterBenchmark(name.c_str(), run);
+    for (const Size &size : sizes) {
+        bench->Arg(size.num_entries);
+    }
+    bench->Unit(benchmark::kMicrosecond)->MinTime(0.02)->Repetitions(9)->ReportAggregatesOnly();
+}
+
+/// The library's own share of the time is a quarter at most.
+ovbench::GoalTable beside_queries()
+{
+    constexpr double limit = 1 / 0.75;
+    GoalTable table{"Route maps, ten of them with the entries spread evenly: the library's "
+                    "operations, beside the host operations that the same work cannot do without, "
+                    "called one after the other with all names at hand. The library's own share "
+                    "of the time is to be a quarter at most.",
+                    "work, entries",
+                    "library",
+                    {"bare host queries"},
+                    {}};
+    for (const Work &work : works) {
+        for (const Size &size : sizes) {
+            table.rows.push_back({std::string(work.label) + ", " + size.label,
+                                  bench_name(work, size),
+                                  {{bare_name(work, size), limit}}});
+        }
+    }
+    return table;
+}
+
+/// Linear: ten times the entries take ten times as long, and half as much again for memory that is
+/// farther away.
+ovbench::GoalTable growth()
+{
+    constexpr double limit = 10 * 1.5;
+    const Size &less = sizes[1];
+    const Size &more = sizes[2];
+    GoalTable table{"How the same grows from 1,000 entries to ten times as many. At most 15 times "
+                    "as long: linear, with half as much again for memory that is farther away.",
+                    "work",
+                    "10,000 entries",
+                    {"1,000 entries"},
+                    {}};
+    for (const Work &work : works) {
+        table.rows.push_back(
+            {work.label, bench_name(work, more), {{bench_name(work, less), limit}}});
+    }
+    return table;
+}
+
+} // namespace
+
+int main(int argc, char **argv)
+{
+    G_daemon_log_level = ov_log_error;
+    allow_many_entries();
+    require_same_ends();
+    GoalReport report{"Policy maps", {beside_queries(), growth()}};
+    for (const Work &work : works) {
+        add_bench(work.name, work.library);
+        add_bench(std::string(work.name) + "_bare", work.bare);
+        report.groups.push_back('^' + std::string(work.name));
+    }
+    return run_with_goals(argc, argv, report);
+}
