@@ -111,11 +111,11 @@ TEST_F(Tunnels, GetNoIdWhenTheStoreFails)
     bench.engine.start_modules();
     bench.store.failure = "the disk is full";
     Candidate candidate = bench.candidate({{tunnel("a"), "a"}});
-    EXPECT_EQ(bench.engine.commit(candidate, "").outcome, CommitOutcome::not_stored);
+    EXPECT_EQ(bench.engine.commit(candidate, {}).outcome, CommitOutcome::not_stored);
     EXPECT_EQ(md_get_total_tunnels(), 0);
     EXPECT_FALSE(md_tunbin_ht_id_has_tunnel(0));
     bench.store.failure.reset();
-    EXPECT_EQ(bench.engine.commit(candidate, "").outcome, CommitOutcome::committed);
+    EXPECT_EQ(bench.engine.commit(candidate, {}).outcome, CommitOutcome::committed);
     EXPECT_THAT(bound(), ElementsAre("a 0"));
 }
 
