@@ -73,7 +73,7 @@ std::string more_text(std::size_t count)
 json detail_json(const ErrorDetail &detail)
 {
     json row = {{"node", shortened(detail.node)},
-                {"message", shortened(printable(detail.message))},
+                {"message", shortened(detail.message)},
                 {"module", detail.module}};
     if (detail.line > 0)
         row["line"] = detail.line;

@@ -41,8 +41,8 @@ inline constexpr const char *stopping = "stopping";
 [[nodiscard]] std::string gap_line(std::uint64_t left_out);
 [[nodiscard]] std::string goodbye_line(const std::string &code, const std::string &message);
 
-/// The "error" object of an answer, and back. What would make it unreadable is cut short: texts are
-/// one line of at most 4096 bytes, and details at most 200, of which the last one then tells how
+/// The "error" object of an answer, and back. What would make it unreadable is cut short: texts
+/// have at most 4096 bytes, and details at most 200, of which the last one then tells how
 /// many more there are. from_json throws nlohmann::json::exception when the
 /// object is not one.
 [[nodiscard]] nlohmann::json error_to_json(const RequestError &error);

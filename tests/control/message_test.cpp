@@ -66,12 +66,13 @@ TEST(MessageTest, ANulByteIsAFaultWhereverItStands)
         << "an escaped one is a character of the text";
 }
 
-TEST(MessageTest, ATextOfAnErrorIsOneLineThatCanBeRead)
+TEST(MessageTest, TheMessageOfAnErrorIsOneLineAndADetailMayHaveSeveral)
 {
-    const json error = error_to_json(RequestError(
-        error_code::refused, std::string("no\n\0\x1b[31m\xc2\x9b!", 12), {{"/a", "b\tc", "m", 0}}));
+    const json error =
+        error_to_json(RequestError(error_code::refused, std::string("no\n\0\x1b[31m\xc2\x9b!", 12),
+                                   {{"/a", "b\n  c", "m", 0}}));
     EXPECT_EQ(error.at("message"), "no\\n\\x00\\x1b[31m\\u009b!");
-    EXPECT_EQ(error.at("details").at(0).at("message"), "b\\tc");
+    EXPECT_EQ(error.at("details").at(0).at("message"), "b\n  c");
 }
 
 TEST(MessageTest, ATextOfAnErrorThatIsTooLongIsCutBetweenCharacters)
