@@ -1,10 +1,14 @@
 #include "host/modules/legacy_upgrade.h"
 
 #include "host/framework/objects.h"
+#include "host/modules/map_kinds.h"
+#include "host/modules/node_access.h"
 #include "host/tree/diff.h"
 #include "host/tree/name.h"
 #include "orvale/md_xmap_common.h"
 
+#include <algorithm>
+#include <iterator>
 #include <optional>
 #include <string>
 
@@ -13,76 +17,48 @@ namespace ovhost
 namespace
 {
 
-using Parts = std::vector<std::string>;
-
-struct LegacyKind {
-    int mtype;
-    const char *maps; ///< the component that tells the kind of maps
-};
-
-/// The kinds of maps that have an older form.
-constexpr LegacyKind legacy_kinds[] = {
-    {MAP_TYPE_R, "route_map"}, {MAP_TYPE_O, "opt_map"}, {MAP_TYPE_Q, "qos_map"},
-    {MAP_TYPE_S, "stats_map"}, {MAP_TYPE_N, "nat_map"},
-};
-
-Parts operator/(Parts parts, const char *child)
+/// Security maps came after the older form.
+bool has_older_form(const MapKind &kind)
 {
-    parts.emplace_back(child);
-    return parts;
+    return !is_security_map(kind);
 }
 
-Parts operator/(Parts parts, const std::string &child)
+/// The nodes below which the entries of a kind have what they match.
+std::vector<std::string> match_roots(const mdb_db &db, const MapKind &kind)
 {
-    return std::move(parts) / child.c_str();
-}
-
-Parts root_of(const LegacyKind &kind)
-{
-    return {"ov", "tunneld", kind.maps, "config", "map"};
-}
-
-/// The match nodes of all entries of a kind.
-std::vector<Parts> match_nodes(const Tree &tree, const LegacyKind &kind)
-{
-    std::vector<Parts> nodes;
-    const Parts root = root_of(kind);
-    for (const std::string &map : tree.children(root)) {
-        const Parts entries = root / map / "prio";
-        for (const std::string &priority : tree.children(entries)) {
-            nodes.push_back(entries / priority / "match" / "0");
+    std::vector<std::string> roots;
+    for (const std::string &map : child_names(&db, kind.root)) {
+        for (const std::string &priority : child_names(&db, map_node(kind, map) + "/prio")) {
+            roots.push_back(entry_node(kind, map, priority) + "/" + kind.match);
         }
     }
-    return nodes;
+    return roots;
 }
 
-std::vector<Parts> match_nodes(const Tree &tree)
+std::vector<std::string> match_roots(const mdb_db &db)
 {
-    std::vector<Parts> all;
-    for (const LegacyKind &kind : legacy_kinds) {
-        const std::vector<Parts> nodes = match_nodes(tree, kind);
-        all.insert(all.end(), nodes.begin(), nodes.end());
+    std::vector<std::string> all;
+    for (const MapKind &kind : map_kinds) {
+        if (has_older_form(kind)) {
+            std::ranges::move(match_roots(db, kind), std::back_inserter(all));
+        }
     }
     return all;
 }
 
-LineFault entry_fault(const Parts &node, std::string message)
+/// The ACL that an entry matches by; empty when there is none.
+std::string acl_of(const mdb_db &db, const std::string &match_root)
 {
-    return {0, join_name(node), std::move(message)};
-}
-
-bool has_text(const Tree &tree, const Parts &name)
-{
-    const Value *const value = tree.value(name);
-    return value != nullptr && !value->text.empty();
+    return node_text(&db, match_root + "/acl").value_or("");
 }
 
 /// How many characters the fields of an entry have together.
-std::size_t field_characters(const Tree &tree, const Parts &match)
+std::size_t field_characters(const mdb_db &db, const std::string &match_root)
 {
     std::size_t characters = 0;
-    tree.visit([&characters](Tree::Parts, const Value &value) { characters += value.text.size(); },
-               match);
+    db.tree.visit(
+        [&characters](Tree::Parts, const Value &value) { characters += value.text.size(); },
+        *split_name(match_root));
     return characters;
 }
 
@@ -92,36 +68,40 @@ constexpr std::size_t longest_fields = MD_XMAP_MATCHSTR_SIZE - 1 - 72;
 
 /// The library cuts the name of a field of an entry with an ACL behind 255 characters, and would
 /// then remove another node.
-constexpr std::size_t longest_match_node = 255 - std::string_view("/application").size();
+constexpr std::size_t longest_match_root = 255 - std::string_view("/application").size();
 
-/// Why an entry must not be handed to the library.
-std::optional<std::string> fault_before(const Tree &running, const Tree &legacy, const Parts &match)
+/// Why an entry of the text must not be handed to the library.
+std::optional<std::string> fault_before(const mdb_db &running, const mdb_db &legacy,
+                                        const std::string &match_root)
 {
-    if (legacy.value(match / "matchstr") != nullptr) {
+    if (node_text(&legacy, match_root + "/matchstr")) {
         return "it has a match string already; give a file whose entries are all of the older form";
     }
-    if (join_name(match).size() > longest_match_node) {
-        return "the entry's names are too long: an upgrade takes " +
-               std::to_string(longest_match_node) + " characters up to here";
+    if (match_root.size() > longest_match_root) {
+        return "its names are too long: an upgrade takes " + std::to_string(longest_match_root) +
+               " characters up to here";
     }
-    const bool has_acl = has_text(legacy, match / "acl");
-    if (const std::size_t characters = field_characters(legacy, match);
-        !has_acl && characters > longest_fields) {
+    if (!acl_of(legacy, match_root).empty()) {
+        return std::nullopt;
+    }
+    const std::size_t characters = field_characters(legacy, match_root);
+    if (characters > longest_fields) {
         return "its fields have " + std::to_string(characters) + " characters; " +
                std::to_string(longest_fields) + " are sure to fit a match string";
     }
-    if (!has_acl && has_text(running, match / "acl")) {
-        // The reference of an ACL whose node alone goes would stay.
-        return "the entry in force matches by the ACL \"" + running.value(match / "acl")->text +
-               "\" and the one of the file does not; delete the entry, commit, and upgrade then";
-    }
-    return std::nullopt;
+    // The reference of an ACL whose node alone goes would stay.
+    const std::string acl = acl_of(running, match_root);
+    return acl.empty() ? std::nullopt
+                       : std::optional("the entry in force matches by the ACL \"" + acl +
+                                       "\" and the one of the file does not; delete the entry, "
+                                       "commit, and upgrade then");
 }
 
-bool is_converted(const Tree &converted, const Parts &match)
+bool is_converted(const mdb_db &converted, const std::string &match_root)
 {
-    return has_text(converted, match / "acl") ? converted.value(match / "application") == nullptr
-                                              : has_text(converted, match / "matchstr");
+    return acl_of(converted, match_root).empty()
+               ? node_text(&converted, match_root + "/matchstr").has_value()
+               : !node_text(&converted, match_root + "/application").has_value();
 }
 
 std::string failure_message(int err)
@@ -139,36 +119,47 @@ std::string failure_message(int err)
 
 /// Converts the entries of a kind. What failed ended the conversion, so that there is one entry to
 /// name; what was passed over without failing is named in full.
-void convert(const LegacyKind &kind, const mdb_db &before, mdb_db &after,
+void convert(const MapKind &kind, const mdb_db &before, mdb_db &after,
              std::vector<LineFault> &faults)
 {
-    const int err = md_xmap_upgrade_to_pattern_match(&after, &before, kind.mtype);
+    const int err = md_xmap_upgrade_to_pattern_match(&after, &before, kind.type);
     const std::size_t faults_before = faults.size();
-    for (const Parts &match : match_nodes(before.tree, kind)) {
-        if (!is_converted(after.tree, match)) {
-            faults.push_back(entry_fault(match, failure_message(err)));
+    for (const std::string &match_root : match_roots(before, kind)) {
+        if (!is_converted(after, match_root)) {
+            faults.push_back({0, match_root, failure_message(err)});
             if (err != 0) {
                 return;
             }
         }
     }
     if (err != 0 && faults.size() == faults_before) {
-        faults.push_back(entry_fault(root_of(kind), failure_message(err)));
+        faults.push_back({0, kind.root, failure_message(err)});
     }
 }
 
 /// Lays the text, and then what the conversion has made of it, over a candidate. No edit can fail:
 /// the text has been read before, and what is not there needs no removing.
-void merge(Candidate &candidate, std::string_view text, const Tree &before, const Tree &after)
+void merge(Candidate &candidate, std::string_view text, const mdb_db &before, const mdb_db &after)
 {
-    for (const Parts &match : match_nodes(before)) {
-        (void)candidate.erase(join_name(match));
+    for (const std::string &match_root : match_roots(before)) {
+        (void)candidate.erase(match_root);
     }
     (void)load_text(candidate, text);
-    for (const Change &change : diff(before, after)) {
+    for (const Change &change : diff(before.tree, after.tree)) {
         const std::string name = join_name(change.parts);
         (void)(change.after ? candidate.set(name, change.after->type, change.after->text)
                             : candidate.erase(name));
+    }
+}
+
+/// Counts the entries, and finds those that must not be converted.
+void judge_entries(const mdb_db &running, const mdb_db &legacy, LegacyUpgrade &result)
+{
+    for (const std::string &match_root : match_roots(legacy)) {
+        if (auto fault = fault_before(running, legacy, match_root)) {
+            result.entry_faults.push_back({0, match_root, *std::move(fault)});
+        }
+        ++(acl_of(legacy, match_root).empty() ? result.converted : result.by_acl);
     }
 }
 
@@ -179,24 +170,26 @@ LegacyUpgrade upgrade_legacy(Candidate &candidate, std::string_view text)
     LegacyUpgrade result;
     Candidate legacy;
     result.line_faults = load_text(legacy, text).faults;
-    for (const Parts &match : match_nodes(legacy.tree())) {
-        if (auto fault = fault_before(candidate.tree(), legacy.tree(), match)) {
-            result.entry_faults.push_back(entry_fault(match, *std::move(fault)));
-        }
-        ++(has_text(legacy.tree(), match / "acl") ? result.by_acl : result.converted);
-    }
     if (!result.is_done()) {
         return result;
     }
+    mdb_db running;
+    running.tree = candidate.tree();
     mdb_db before;
     before.tree = legacy.tree();
+    judge_entries(running, before, result);
+    if (!result.is_done()) {
+        return result;
+    }
     mdb_db after = before;
     after.writable = true;
-    for (const LegacyKind &kind : legacy_kinds) {
-        convert(kind, before, after, result.entry_faults);
+    for (const MapKind &kind : map_kinds) {
+        if (has_older_form(kind)) {
+            convert(kind, before, after, result.entry_faults);
+        }
     }
     if (result.is_done()) {
-        merge(candidate, text, before.tree, after.tree);
+        merge(candidate, text, before, after);
     }
     return result;
 }
