@@ -24,7 +24,6 @@
 #include "host/commit/report.h"
 #include "host/commit/transaction.h"
 
-#include <concepts>
 #include <string>
 #include <vector>
 
@@ -61,15 +60,7 @@ class CommitEngine
 
     /// The first commit, on an empty running configuration: defaults come in by the same road as
     /// everything after them. Throws std::logic_error when there is a configuration already.
-    [[nodiscard]] CommitReport initial(Candidate &candidate, const CommitNote &note = {});
-
-    template <std::same_as<std::string> Text>
-    [[nodiscard]] CommitReport commit(Candidate &candidate, const Text &comment)
-    {
-        CommitNote note;
-        note.comment = comment;
-        return commit(candidate, note);
-    }
+    [[nodiscard]] CommitReport initial(Candidate &candidate, const CommitNote &note);
 
   private:
     /// Steps 4 to 7 of an accepted transaction.

@@ -2,9 +2,11 @@
 
 #include "framework/appliance.h"
 #include "framework/logging.h"
+#include "host/commit/past.h"
 #include "host/framework/appliance_config.h"
 #include "host/framework/log_config.h"
 #include "host/framework/model_nodes.h"
+#include "host/framework/time_refresh.h"
 #include "host/modules/default_values.h"
 #include "host/modules/node_access.h"
 #include "orvale/md_dyna_limits.h"
@@ -57,8 +59,8 @@ void warn_of_another_model(const mdb_db &configuration)
 
 } // namespace
 
-Configuration::Configuration(const std::filesystem::path &state_dir)
-    : store_(Store::open(state_dir)), adapter_(store_), engine_(adapter_)
+Configuration::Configuration(const std::filesystem::path &state_dir, const HistoryBounds &history)
+    : store_(Store::open(state_dir, history)), adapter_(store_), engine_(adapter_)
 {
     // Order counts: checks refuse before anything follows, and events tell of what is done.
     engine_.add_module(schema_);
@@ -109,7 +111,7 @@ void Configuration::start_modules(const Tree &configuration)
 
 void Configuration::commit_first()
 {
-    const CommitReport report = engine_.initial(candidate_);
+    const CommitReport report = engine_.initial(candidate_, daemon_note("initial configuration"));
     if (!report.accepted()) {
         throw std::runtime_error(describe(report));
     }
@@ -130,6 +132,8 @@ void Configuration::start()
         commit_first();
     } else {
         start_modules(running());
+        confirmations_.take_up();
+        undo_if_due();
     }
     // The file may have been lost while the daemon was away; the library logs why it fails.
     if (write_dyna_limits_conf(running_db()) != 0) {
@@ -138,9 +142,45 @@ void Configuration::start()
     }
 }
 
+CommitReport Configuration::commit(const CommitNote &note)
+{
+    return confirmations_.commit(candidate_, note);
+}
+
 CommitReport Configuration::commit(const std::string &comment)
 {
-    return engine_.commit(candidate_, comment);
+    return commit(daemon_note(comment));
+}
+
+CommitReport Configuration::rollback(std::uint64_t number, CommitNote note)
+{
+    note.rollback_to = number;
+    if (note.comment.empty()) {
+        note.comment = "rollback to commit " + std::to_string(number);
+    }
+    Candidate past(running());
+    past.replace(after(number));
+    CommitReport report = confirmations_.commit(past, note);
+    candidate_.rebase(running());
+    return report;
+}
+
+void Configuration::undo_if_due()
+{
+    refresh_time_info();
+    if (confirmations_.undo_if_due()) {
+        candidate_.rebase(running());
+    }
+}
+
+std::uint64_t Configuration::oldest_known_commit() const
+{
+    return ovhost::oldest_known_commit(store_);
+}
+
+Tree Configuration::after(std::uint64_t commit) const
+{
+    return configuration_after(store_, running(), commit);
 }
 
 } // namespace ovhost

@@ -5,6 +5,7 @@
 #include "host/commit/candidate.h"
 #include "host/commit/engine.h"
 #include "host/framework/objects.h"
+#include "host/mgmtd/confirmations.h"
 #include "host/modules/acls.h"
 #include "host/modules/applications.h"
 #include "host/modules/change_events.h"
@@ -29,14 +30,16 @@ class Configuration
 {
   public:
     /// Opens the store and takes up what it holds. Throws StoreError.
-    explicit Configuration(const std::filesystem::path &state_dir);
+    explicit Configuration(const std::filesystem::path &state_dir,
+                           const HistoryBounds &history = {});
     ~Configuration();
     Configuration(const Configuration &) = delete;
     Configuration &operator=(const Configuration &) = delete;
 
     /// Builds the first configuration when the store is empty, and brings what follows the
-    /// configuration (model information, tunnels, limits file) up to date. Throws
-    /// std::runtime_error when there is no configuration to run with.
+    /// configuration (model information, tunnels, limits file) up to date. Commits that were not
+    /// confirmed in time are undone. Throws std::runtime_error when there is no configuration to
+    /// run with.
     void start();
 
     [[nodiscard]] const Tree &running() const { return engine_.running(); }
@@ -47,10 +50,31 @@ class Configuration
     [[nodiscard]] Candidate &candidate() { return candidate_; }
 
     [[nodiscard]] CheckReport check() { return engine_.check(candidate_); }
+    [[nodiscard]] CommitReport commit(const CommitNote &note);
+
+    /// A commit of the daemon itself.
     [[nodiscard]] CommitReport commit(const std::string &comment);
+
+    /// Commits the configuration as it was after a commit (see past.h for which). The candidate
+    /// keeps its edits. Throws StoreError.
+    [[nodiscard]] CommitReport rollback(std::uint64_t number, CommitNote note);
+
+    /// Confirms the commits that wait for it; false when none does. Throws StoreError.
+    bool confirm() { return confirmations_.confirm(); }
+
+    /// Undoes commits that were not confirmed in time. The candidate keeps its edits.
+    void undo_if_due();
     void discard() { candidate_.discard(running()); }
 
     [[nodiscard]] std::uint64_t commit_number() const { return store_.commit_number(); }
+
+    /// The history of commits.
+    [[nodiscard]] const Store &store() const { return store_; }
+    [[nodiscard]] const Confirmations &confirmations() const { return confirmations_; }
+
+    /// See past.h.
+    [[nodiscard]] std::uint64_t oldest_known_commit() const;
+    [[nodiscard]] Tree after(std::uint64_t commit) const;
 
     /// Tunnel IDs that were freed a short time ago.
     [[nodiscard]] const HeldIds &held_ids() const { return tunnels_.held_ids(); }
@@ -74,6 +98,7 @@ class Configuration
     LimitsModule limits_;
     ChangeEventsModule events_;
     CommitEngine engine_;
+    Confirmations confirmations_{store_, engine_};
     Candidate candidate_;
     mdb_db running_db_;
 };

@@ -10,8 +10,10 @@
 #include "host/mgmtd/peer_sessions.h"
 #include "host/mgmtd/private_root.h"
 #include "host/mgmtd/requests.h"
+#include "host/mgmtd/undo_timer.h"
 #include "host/support/standard_fds.h"
 
+#include <csignal>
 #include <cstdio>
 #include <optional>
 #include <string>
@@ -36,13 +38,23 @@ void run(const DaemonOptions &options)
     }
     set_config_name(options.model);
 
-    Configuration configuration(options.state_dir);
+    // A file that may not grow is a failing write, which refuses a commit.
+    std::signal(SIGXFSZ, SIG_IGN);
+
+    Configuration configuration(options.state_dir, options.history);
     std::optional<PeerSessions> sessions;
     ControlServer *server_view = nullptr;
-    Requests requests(configuration, {[&server_view] { return server_view->peers(); },
-                                      [&sessions] { sessions->update(); }});
     EventLoop loop;
     loop.stop_on_signals();
+    UndoTimer undo_timer(
+        loop, [&configuration] { return configuration.confirmations().time_left(); },
+        [&configuration, &sessions] {
+            sessions->update();
+            configuration.undo_if_due();
+        });
+    Requests requests(configuration,
+                      {[&server_view] { return server_view->peers(); },
+                       [&sessions] { sessions->update(); }, [&undo_timer] { undo_timer.set(); }});
     ServerLimits limits;
     limits.max_events_waiting = std::size_t{options.peer_buffer_mib} << 20;
     ControlServer server(loop, options.socket, limits, requests, log_control_line);
@@ -51,6 +63,7 @@ void run(const DaemonOptions &options)
 
     // The socket is ours before anything is built: a second daemon must not get that far.
     configuration.start();
+    undo_timer.set();
     log_host_line(ov_log_notice, "mgmtd", "ready on " + options.socket);
     const int signal = loop.run();
     log_host_line(ov_log_notice, "mgmtd", "stopping on signal " + std::to_string(signal));

@@ -63,11 +63,20 @@ std::optional<DaemonOptions> parse_options(int argc, char **argv, int &ret_exit_
                    "MiB of events that may wait for a peer before it is disconnected")
         ->check(CLI::Range(1, 4096))
         ->capture_default_str();
+    app.add_option("--history", options.history.commits, "Commits that the history keeps")
+        ->check(CLI::Range(1, 1000000))
+        ->capture_default_str();
+    std::uint64_t history_mib = options.history.bytes >> 20;
+    app.add_option("--history-size", history_mib,
+                   "MiB of names and values that the history keeps; the newest commit always stays")
+        ->check(CLI::Range(1, 1048576))
+        ->capture_default_str();
     add_level(app, "--log-level", options.log_level, "Lines up to this level are logged (notice)");
     add_level(app, "--module-log-level", options.module_log_level,
               "Level at which the library's interface count manager logs (info)");
     try {
         app.parse(argc, argv);
+        options.history.bytes = history_mib << 20;
     } catch (const CLI::ParseError &fault) {
         const int code = app.exit(fault);
         ret_exit_code = code == 0 ? 0 : 2;

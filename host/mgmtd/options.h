@@ -1,6 +1,8 @@
 #pragma once
 // The command line of mgmtd.
 
+#include "host/store/commit_record.h"
+
 #include <filesystem>
 #include <optional>
 #include <string>
@@ -16,6 +18,7 @@ struct DaemonOptions {
     int log_level = 5;
     int module_log_level = 6;
     unsigned peer_buffer_mib = 64;
+    HistoryBounds history;
 };
 
 /// Reads the command line. Nothing when the process is to end with `ret_exit_code`: help was asked

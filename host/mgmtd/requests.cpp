@@ -6,6 +6,8 @@
 #include "host/control/server.h"
 #include "host/framework/log_config.h"
 #include "host/framework/time_refresh.h"
+#include "host/mgmtd/answers.h"
+#include "host/mgmtd/history_requests.h"
 #include "host/mgmtd/show.h"
 #include "host/modules/legacy_upgrade.h"
 #include "host/modules/node_access.h"
@@ -24,38 +26,6 @@ namespace
 
 using nlohmann::json;
 
-json value_json(const std::optional<Value> &value)
-{
-    return value ? json{{"type", type_name(value->type)}, {"value", value->text}} : json();
-}
-
-json change_json(const Change &change)
-{
-    const char *const kind = !change.before ? "add" : !change.after ? "delete" : "modify";
-    return {{"change", kind},
-            {"name", join_name(change.parts)},
-            {"old", value_json(change.before)},
-            {"new", value_json(change.after)}};
-}
-
-json changes_json(const std::vector<Change> &changes)
-{
-    auto list = json::array();
-    for (const Change &change : changes) {
-        list.push_back(change_json(change));
-    }
-    return list;
-}
-
-json warnings_json(const std::vector<Warning> &warnings)
-{
-    auto texts = json::array();
-    for (const Warning &warning : warnings) {
-        texts.push_back(warning.message);
-    }
-    return texts;
-}
-
 std::vector<std::string> required_name(const json &request)
 {
     const std::string name = required_text(request, "name");
@@ -73,16 +43,6 @@ std::size_t count_values(const Tree &tree, Tree::Parts below)
     std::size_t count = 0;
     tree.visit([&count](Tree::Parts, const Value &) { ++count; }, below);
     return count;
-}
-
-[[noreturn]] void throw_refused(const char *what, const std::vector<Refusal> &refusals)
-{
-    std::vector<ErrorDetail> details;
-    details.reserve(refusals.size());
-    for (const Refusal &refusal : refusals) {
-        details.push_back({refusal.node, refusal.message, refusal.module, 0});
-    }
-    throw RequestError(error_code::refused, what, std::move(details));
 }
 
 std::vector<ErrorDetail> details_of(const std::vector<LineFault> &faults)
@@ -118,12 +78,13 @@ struct Requests::Command {
 };
 
 const Requests::Command Requests::commands[] = {
-    {"get", &Requests::get},         {"set", &Requests::set},
-    {"delete", &Requests::erase},    {"load", &Requests::load},
-    {"discard", &Requests::discard}, {"diff", &Requests::diff_candidate},
-    {"check", &Requests::check},     {"commit", &Requests::commit},
-    {"status", &Requests::status},   {"show", &Requests::show},
-    {"upgrade", &Requests::upgrade},
+    {"get", &Requests::get},           {"set", &Requests::set},
+    {"delete", &Requests::erase},      {"load", &Requests::load},
+    {"discard", &Requests::discard},   {"diff", &Requests::diff},
+    {"check", &Requests::check},       {"commit", &Requests::commit},
+    {"status", &Requests::status},     {"show", &Requests::show},
+    {"upgrade", &Requests::upgrade},   {"history", &Requests::history},
+    {"rollback", &Requests::rollback}, {"confirm", &Requests::confirm},
 };
 
 Requests::Requests(Configuration &configuration, DaemonView daemon)
@@ -220,8 +181,11 @@ json Requests::discard(const json &, const ClientInfo &)
     return {{"changes", dropped}};
 }
 
-json Requests::diff_candidate(const json &, const ClientInfo &)
+json Requests::diff(const json &request, const ClientInfo &)
 {
+    if (request.contains("after")) {
+        return answer_past_diff(configuration_, request);
+    }
     return {
         {"changes", changes_json(configuration_.candidate().pending(configuration_.running()))}};
 }
@@ -236,30 +200,44 @@ json Requests::check(const json &, const ClientInfo &)
 }
 
 /// Commits the candidate; anything but an accepted commit is thrown.
-CommitReport Requests::store_candidate(const std::string &comment, const char *refusal)
+CommitReport Requests::store_candidate(const CommitNote &note, const char *refusal)
 {
     daemon_.before_events();
-    CommitReport report = configuration_.commit(comment);
-    if (report.outcome == CommitOutcome::not_stored) {
-        throw RequestError(error_code::internal, report.store_error);
-    }
-    if (!report.accepted()) {
-        throw_refused(refusal, report.refusals);
-    }
+    CommitReport report = configuration_.commit(note);
+    daemon_.wait_changed();
+    throw_unless_accepted(report, refusal);
     return report;
 }
 
-json Requests::commit(const json &request, const ClientInfo &)
+json Requests::commit(const json &request, const ClientInfo &client)
 {
+    const std::optional<Wait> waited = configuration_.store().wait();
     const CommitReport report =
-        store_candidate(optional_text(request, "comment"), "the commit is refused");
-    const bool committed = report.outcome == CommitOutcome::committed;
-    return {{"number", configuration_.commit_number()},
-            {"changes", committed ? report.changes.size() : 0},
-            {"warnings", warnings_json(report.warnings)}};
+        store_candidate(client_note(request, client), "the commit is refused");
+    return commit_answer(configuration_, report, waited);
 }
 
-json Requests::upgrade(const json &request, const ClientInfo &)
+json Requests::history(const json &request, const ClientInfo &)
+{
+    return answer_history(configuration_, request);
+}
+
+json Requests::rollback(const json &request, const ClientInfo &client)
+{
+    daemon_.before_events();
+    json answer = answer_rollback(configuration_, request, client);
+    daemon_.wait_changed();
+    return answer;
+}
+
+json Requests::confirm(const json &, const ClientInfo &)
+{
+    json answer = answer_confirm(configuration_);
+    daemon_.wait_changed();
+    return answer;
+}
+
+json Requests::upgrade(const json &request, const ClientInfo &client)
 {
     const std::string text = required_text(request, "text");
     const std::string source = optional_text(request, "source", "text");
@@ -279,8 +257,11 @@ json Requests::upgrade(const json &request, const ClientInfo &)
         throw RequestError(error_code::refused, "entries cannot be upgraded; nothing was stored",
                            details_of(result.entry_faults));
     }
-    const CommitReport report =
-        store_candidate("upgrade from " + source, "the upgraded configuration is refused");
+    CommitNote note = client_note(request, client);
+    if (note.comment.empty()) {
+        note.comment = "upgrade from " + source;
+    }
+    const CommitReport report = store_candidate(note, "the upgraded configuration is refused");
     return {{"converted", result.converted},
             {"by_acl", result.by_acl},
             {"number", configuration_.commit_number()},
@@ -301,7 +282,7 @@ json Requests::status(const json &, const ClientInfo &)
     const Candidate &candidate = configuration_.candidate();
     const auto uptime = std::chrono::duration_cast<std::chrono::seconds>(
         std::chrono::steady_clock::now() - started_);
-    return {
+    json answer = {
         {"version", program_version()},
         {"pid", ::getpid()},
         {"model", model != nullptr ? json(model) : json()},
@@ -311,6 +292,10 @@ json Requests::status(const json &, const ClientInfo &)
         {"candidate_changes", candidate.pending(configuration_.running()).size()},
         {"peers", std::move(peers)},
         {"uptime_seconds", uptime.count()}};
+    if (configuration_.store().wait()) {
+        answer["waits"] = wait_json(configuration_);
+    }
+    return answer;
 }
 
 json Requests::show(const json &request, const ClientInfo &)

@@ -1,6 +1,7 @@
 #pragma once
 // What clients can ask of the daemon: one handler for each command of docs/control-protocol.md.
-// control/server.h brings the requests; configuration.h is what they are about.
+// control/server.h brings the requests; configuration.h is what they are about. history_requests.h
+// and show.h have the answers of their own fields.
 
 #include "host/control/request_handler.h"
 #include "host/mgmtd/configuration.h"
@@ -21,6 +22,8 @@ struct DaemonView {
     std::function<std::vector<PeerStatus>()> peers;
     /// Called before anything that may send events.
     std::function<void()> before_events;
+    /// Called when a commit may have begun to wait for its confirmation, or need not any more.
+    std::function<void()> wait_changed = [] {};
 };
 
 class Requests : public RequestHandler
@@ -40,14 +43,17 @@ class Requests : public RequestHandler
     nlohmann::json erase(const nlohmann::json &request, const ClientInfo &client);
     nlohmann::json load(const nlohmann::json &request, const ClientInfo &client);
     nlohmann::json discard(const nlohmann::json &request, const ClientInfo &client);
-    nlohmann::json diff_candidate(const nlohmann::json &request, const ClientInfo &client);
+    nlohmann::json diff(const nlohmann::json &request, const ClientInfo &client);
     nlohmann::json check(const nlohmann::json &request, const ClientInfo &client);
     nlohmann::json commit(const nlohmann::json &request, const ClientInfo &client);
     nlohmann::json status(const nlohmann::json &request, const ClientInfo &client);
     nlohmann::json show(const nlohmann::json &request, const ClientInfo &client);
     nlohmann::json upgrade(const nlohmann::json &request, const ClientInfo &client);
+    nlohmann::json history(const nlohmann::json &request, const ClientInfo &client);
+    nlohmann::json rollback(const nlohmann::json &request, const ClientInfo &client);
+    nlohmann::json confirm(const nlohmann::json &request, const ClientInfo &client);
 
-    CommitReport store_candidate(const std::string &comment, const char *refusal);
+    CommitReport store_candidate(const CommitNote &note, const char *refusal);
 
     Configuration &configuration_;
     DaemonView daemon_;

@@ -4,6 +4,7 @@
 #include "host/control/arguments.h"
 #include "host/control/request_error.h"
 #include "host/mgmtd/configuration.h"
+#include "host/mgmtd/history_requests.h"
 #include "host/mgmtd/show_maps.h"
 #include "host/modules/mode.h"
 #include "host/modules/tunnel_lookup.h"
@@ -135,6 +136,7 @@ constexpr Subject subjects[] = {
     {"maps", show_maps},
     {"acl", show_acl},
     {"references", show_references},
+    {"commit", answer_show_commit},
 };
 
 } // namespace

@@ -1,0 +1,184 @@
+#include "host/mgmtd/confirmations.h"
+
+#include "framework/logging.h"
+#include "host/commit/past.h"
+#include "host/framework/log_config.h"
+
+#include <algorithm>
+#include <exception>
+#include <utility>
+
+namespace ovhost
+{
+namespace
+{
+
+void log_line(int level, const std::string &text)
+{
+    log_host_line(level, "mgmtd", text);
+}
+
+std::string commits_text(const Wait &wait)
+{
+    const std::string last = std::to_string(wait.number);
+    return wait.back_to + 1 == wait.number
+               ? "commit " + last
+               : "commits " + std::to_string(wait.back_to + 1) + " to " + last;
+}
+
+/// All that a failed commit says, in one line.
+std::string describe(const CommitReport &report)
+{
+    if (report.outcome == CommitOutcome::not_stored) {
+        return report.store_error;
+    }
+    std::string text;
+    for (const Refusal &refusal : report.refusals) {
+        text += (text.empty() ? "" : "; ") + (refusal.node.empty() ? "" : refusal.node + ": ") +
+                refusal.message + " (" + refusal.module + ")";
+    }
+    return text;
+}
+
+CommitReport not_stored(const std::exception &error)
+{
+    CommitReport report;
+    report.outcome = CommitOutcome::not_stored;
+    report.store_error = error.what();
+    return report;
+}
+
+} // namespace
+
+std::int64_t commit_time()
+{
+    return std::chrono::duration_cast<std::chrono::seconds>(
+               std::chrono::system_clock::now().time_since_epoch())
+        .count();
+}
+
+CommitNote daemon_note(const std::string &comment)
+{
+    CommitNote note;
+    note.time = commit_time();
+    note.author = "mgmtd";
+    note.comment = comment;
+    return note;
+}
+
+void Confirmations::follow()
+{
+    if (store_.wait() == wait_) {
+        return;
+    }
+    wait_ = store_.wait();
+    refusal_.clear();
+    if (wait_) {
+        due_ = Clock::now() + std::chrono::seconds(wait_->seconds);
+    }
+}
+
+void Confirmations::take_up()
+{
+    follow();
+    if (!wait_) {
+        return;
+    }
+    const std::int64_t left =
+        std::clamp<std::int64_t>(wait_->deadline - commit_time(), 0, wait_->seconds);
+    due_ = Clock::now() + std::chrono::seconds(left);
+    log_line(ov_log_notice, commits_text(*wait_) + " will be undone in " + std::to_string(left) +
+                                " s unless confirmed");
+}
+
+CommitReport Confirmations::commit(Candidate &candidate, const CommitNote &note)
+{
+    CommitReport report = engine_.commit(candidate, note);
+    if (report.outcome == CommitOutcome::unchanged && !note.confirm_within) {
+        try {
+            (void)confirm();
+        } catch (const StoreError &error) {
+            report = not_stored(error);
+        }
+    }
+    follow();
+    return report;
+}
+
+bool Confirmations::confirm()
+{
+    if (!store_.wait()) {
+        return false;
+    }
+    const Wait wait = *store_.wait();
+    store_.confirm();
+    follow();
+    log_line(ov_log_notice, commits_text(wait) +
+                                (wait.back_to + 1 == wait.number ? " is" : " are") + " confirmed");
+    return true;
+}
+
+std::optional<std::chrono::milliseconds> Confirmations::time_left() const
+{
+    if (!wait_) {
+        return std::nullopt;
+    }
+    using std::chrono::milliseconds;
+    return std::max(std::chrono::ceil<milliseconds>(due_ - Clock::now()), milliseconds(0));
+}
+
+bool Confirmations::undo_if_due()
+{
+    if (!wait_ || Clock::now() < due_) {
+        return false;
+    }
+    const Wait wait = *wait_;
+    const CommitReport report = undo(wait);
+    if (!report.accepted()) {
+        put_off(wait, describe(report));
+        return false;
+    }
+    for (const Warning &warning : report.warnings) {
+        log_line(ov_log_warning, warning.message);
+    }
+    log_line(ov_log_warning, commits_text(wait) +
+                                 (wait.back_to + 1 == wait.number ? " was" : " were") +
+                                 " not confirmed in time: the configuration is again as after "
+                                 "commit " +
+                                 std::to_string(wait.back_to));
+    return true;
+}
+
+CommitReport Confirmations::undo(const Wait &wait)
+{
+    try {
+        Candidate candidate(engine_.running());
+        candidate.replace(configuration_after(store_, engine_.running(), wait.back_to));
+        CommitNote note = daemon_note("undo of " + commits_text(wait) + ", not confirmed in time");
+        note.rollback_to = wait.back_to;
+        note.undoes_wait = true;
+        return commit(candidate, note);
+    } catch (const std::exception &error) {
+        // Called by a timer: there is nobody else to tell, and the next try may do.
+        return not_stored(error);
+    }
+}
+
+void Confirmations::put_off(const Wait &wait, const std::string &why)
+{
+    due_ = Clock::now() + retry_interval;
+    if (why == refusal_) {
+        return;
+    }
+    refusal_ = why;
+    log_line(ov_log_error, commits_text(wait) + " cannot be undone: " + why +
+                               "; trying again every " + std::to_string(retry_interval.count()) +
+                               " s until it can be, or is confirmed, or there is another commit");
+    try {
+        store_.note_undo_refusal(why);
+    } catch (const StoreError &error) {
+        log_line(ov_log_error, error.what());
+    }
+}
+
+} // namespace ovhost
