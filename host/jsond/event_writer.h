@@ -7,7 +7,7 @@
 #include <nlohmann/json_fwd.hpp>
 
 #include <string>
-#include <string_view>
+#include <system_error>
 
 namespace ovhost
 {
@@ -25,8 +25,7 @@ class EventWriter
     [[nodiscard]] bool write(const nlohmann::json &event);
 
   private:
-    [[nodiscard]] bool wait_for_reader() const;
-    [[noreturn]] void fail() const;
+    [[noreturn]] void fail(const std::error_code &cause) const;
 
     std::string name_;
     UniqueFd file_;

@@ -2,8 +2,8 @@
 // the work.
 
 #include "host/jsond/peer.h"
-#include "host/jsond/signal_pipe.h"
 #include "host/support/command_line.h"
+#include "host/support/signal_pipe.h"
 #include "host/support/standard_fds.h"
 #include "host/support/version.h"
 

@@ -1,5 +1,6 @@
 #pragma once
-// Turns SIGTERM and SIGINT into a readable descriptor, so that every wait of jsond can end by them.
+// Turns SIGTERM and SIGINT into a readable descriptor, so that every wait of a program can end by
+// them.
 
 #include "host/support/unique_fd.h"
 

@@ -1,4 +1,4 @@
-#include "host/jsond/signal_pipe.h"
+#include "host/support/signal_pipe.h"
 
 #include <fcntl.h>
 
