@@ -12,6 +12,7 @@ std::vector<FaultRow> md_tunneld_tunnel_common_rows();
 std::vector<FaultRow> tunnel_id_rows();
 std::vector<FaultRow> xmap_checks_rows();
 std::vector<FaultRow> xmap_match_rows();
+std::vector<FaultRow> xmap_upgrade_rows();
 
 const std::vector<FaultRow> &fault_rows()
 {
@@ -20,7 +21,7 @@ const std::vector<FaultRow> &fault_rows()
         for (const auto rows_of_unit :
              {md_db_default_rows, md_dyna_limits_rows, md_event_common_rows, md_tunbin_ht_rows,
               md_tunneld_tunnel_common_rows, tunnel_id_rows, xmap_checks_rows, xmap_match_rows,
-              application_rows}) {
+              xmap_upgrade_rows, application_rows}) {
             for (FaultRow &row : rows_of_unit()) {
                 rows.push_back(std::move(row));
             }

@@ -76,10 +76,18 @@ inline ExpectedLine gated(int level, const std::string &text)
     return {ExpectedLine::Kind::gated, {}, {}, text, level};
 }
 
+using Lines = std::vector<ExpectedLine>;
+
+inline Lines operator+(Lines lines, const Lines &further)
+{
+    lines.insert(lines.end(), further.begin(), further.end());
+    return lines;
+}
+
 // What a call answers and logs.
 struct Outcome {
     std::string answer;
-    std::vector<ExpectedLine> log = {};
+    Lines log = {};
 };
 
 // Which failures an outcome is about.

@@ -10,8 +10,6 @@ namespace
 
 const UnitLines unit("md_tunneld_tunnel_common");
 
-using Lines = std::vector<ExpectedLine>;
-
 constexpr char in_acl[] = "md_find_app_name_in_acl";
 constexpr char in_map[] = "md_find_app_name_in_xxxmap";
 constexpr char anywhere[] = "md_find_appname_in_acl_or_xxxmap";
@@ -23,21 +21,6 @@ template <const char *node>
 void with_use(HostFixture &host)
 {
     host.set(node, bt_string, "web");
-}
-
-// "null", or the texts in brackets; the array is freed.
-std::string taken_array(tstr_array *array)
-{
-    if (array == nullptr) {
-        return "null";
-    }
-    std::string all = "[";
-    for (int32 i = 0; i < tstr_array_length_quick(array); ++i) {
-        all += (i != 0 ? " " : "");
-        all += tstr_array_get_str_quick(array, static_cast<uint32>(i));
-    }
-    tstr_array_free(&array);
-    return all + ']';
 }
 
 tstr_array *new_array()
@@ -80,7 +63,7 @@ FaultRow acl_row()
                 tstr_array *const bnames = new_array();
                 const int status =
                     in_library(md_find_app_name_in_acl, "web", host.db(), &found, bnames);
-                return std::to_string(status) + (found ? " yes " : " no ") + taken_array(bnames);
+                return std::to_string(status) + (found ? " yes " : " no ") + taken(bnames);
             },
             {std::string("0 yes [") + acl_node + ']', {acls_line(1)}},
             {{fails(Operation::mdb_get_tstr_array, 1), {"{code} no []", {bail}}},
@@ -107,7 +90,7 @@ FaultRow map_row()
                 tstr_array *const bnames = new_array();
                 const int status = in_library(md_find_app_name_in_xxxmap, "web", host.db(),
                                               "/ov/tunneld/qos_map/config/map", &found, bnames);
-                return std::to_string(status) + (found ? " yes " : " no ") + taken_array(bnames);
+                return std::to_string(status) + (found ? " yes " : " no ") + taken(bnames);
             },
             {std::string("0 yes [") + map_node + ']', {maps_line(1), entries_line()}},
             {{fails(Operation::mdb_get_tstr_array, 1), {"{code} no []", {bail}}},
@@ -129,9 +112,7 @@ FaultRow anywhere_row()
     const ExpectedLine bail = unit.bail(anywhere);
     const Lines all = {acls_line(0), maps_line(0), maps_line(0), maps_line(1), entries_line()};
     const auto lines = [&all](std::ptrdiff_t count, const Lines &further) {
-        Lines some(all.begin(), all.begin() + count);
-        some.insert(some.end(), further.begin(), further.end());
-        return some;
+        return Lines(all.begin(), all.begin() + count) + further;
     };
     const auto map_failed = [&](std::ptrdiff_t count) -> Outcome {
         return {"{code} null null", lines(count, {unit.bail(in_map), bail})};
@@ -148,7 +129,7 @@ FaultRow anywhere_row()
             tstr_array *bnames = nullptr;
             const int status =
                 in_library(md_find_appname_in_acl_or_xxxmap, "web", host.db(), &message, &bnames);
-            return std::to_string(status) + ' ' + taken(message) + ' ' + taken_array(bnames);
+            return std::to_string(status) + ' ' + taken(message) + ' ' + taken(bnames);
         },
         {used, all},
         {{fails(Operation::tstr_array_new), {"{code} null null", {bail}}},
@@ -206,7 +187,7 @@ FaultRow names_row()
             [](HostFixture &host) {
                 tstr_array *names = nullptr;
                 const int status = in_library(md_get_custom_app_names, host.db(), &names);
-                return std::to_string(status) + ' ' + taken_array(names);
+                return std::to_string(status) + ' ' + taken(names);
             },
             {"0 [a]"},
             {{fails(Operation::array_options_get_defaults), failed},

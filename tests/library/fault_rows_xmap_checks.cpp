@@ -14,8 +14,6 @@ namespace ovtest
 namespace
 {
 
-using Lines = std::vector<ExpectedLine>;
-
 const UnitLines unit("md_xmap_common");
 
 constexpr char references_function[] = "md_acl_ref_processing";
