@@ -160,6 +160,45 @@ TEST_F(OvctlTest, LoadReadsStandardInput)
               (json{{"command", "load"}, {"text", "/a,uint32,5\n"}, {"source", "standard input"}}));
 }
 
+TEST_F(OvctlTest, UpgradeSendsAFileAndPrintsTheChanges)
+{
+    const TempDir dir;
+    const std::string text = "/a,string,x\n";
+    test::write_file(dir.path("legacy.db"), text);
+    const json matchstr = {{"change", "add"},
+                           {"name", "/m"},
+                           {"old", nullptr},
+                           {"new", {{"type", "string"}, {"value", "dscp:ef"}}}};
+    answer_with({{"converted", 1},
+                 {"by_acl", 2},
+                 {"number", 5},
+                 {"changes", json::array({matchstr})},
+                 {"warnings", {"w"}}});
+    EXPECT_EQ(ask({"upgrade", dir.path("legacy.db")}),
+              (Outcome{0,
+                       "+ /m string dscp:ef\n"
+                       "warning: w\n"
+                       "1 entry converted to match strings, 2 by ACL as before\n"
+                       "commit 5: 1 change\n",
+                       ""}));
+    EXPECT_EQ(request(),
+              (json{{"command", "upgrade"}, {"text", text}, {"source", dir.path("legacy.db")}}));
+}
+
+TEST_F(OvctlTest, UpgradeSaysThatNothingIsNew)
+{
+    answer_with({{"converted", 2},
+                 {"by_acl", 0},
+                 {"number", 5},
+                 {"changes", json::array()},
+                 {"warnings", json::array()}});
+    EXPECT_EQ(ask({"upgrade", "-"}, "x"),
+              (Outcome{0,
+                       "2 entries converted to match strings, 0 by ACL as before\n"
+                       "nothing to commit\n",
+                       ""}));
+}
+
 TEST_F(OvctlTest, AFileThatCannotBeReadIsNamed)
 {
     EXPECT_EQ(ask({"load", "/nowhere/site.db"}),
