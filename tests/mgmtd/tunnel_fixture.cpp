@@ -26,26 +26,9 @@ TunnelTest::TunnelTest()
     EXPECT_EQ(get_max_tunnel_number(), 1024U);
 }
 
-void TunnelTest::restart()
-{
-    configuration_.reset();
-    configuration_.emplace(state_.path());
-    configuration_->start();
-}
-
 void TunnelTest::pass(uint64 milliseconds)
 {
     time_info_ptr->time_since_boot_ms += milliseconds;
-}
-
-void TunnelTest::set(const std::string &node, bn_type type, const std::string &value)
-{
-    EXPECT_EQ(configuration_->candidate().set(node, type, value), std::nullopt);
-}
-
-void TunnelTest::erase(const std::string &node)
-{
-    EXPECT_EQ(configuration_->candidate().erase(node), std::nullopt);
 }
 
 void TunnelTest::add(const std::string &name, const std::string &alias)
@@ -59,32 +42,6 @@ void TunnelTest::add(const std::string &name, const std::string &alias)
 void TunnelTest::set_id(const std::string &name, unsigned id)
 {
     set(tunnel(name, "id"), bt_uint16, std::to_string(id));
-}
-
-std::string TunnelTest::commit()
-{
-    const CommitReport report = configuration_->commit("");
-    EXPECT_THAT(report.warnings, testing::IsEmpty());
-    if (report.accepted()) {
-        return report.outcome == CommitOutcome::committed ? "committed" : "unchanged";
-    }
-    std::string text;
-    for (const std::string &refusal : refusals_of(report.refusals)) {
-        text += refusal + "\n";
-    }
-    return text;
-}
-
-std::string TunnelTest::commit_in_vain()
-{
-    const std::string text = commit();
-    configuration_->discard();
-    return text;
-}
-
-std::string TunnelTest::value(const std::string &node) const
-{
-    return value_in(configuration_->running(), node);
 }
 
 std::string TunnelTest::stored(const std::string &name) const

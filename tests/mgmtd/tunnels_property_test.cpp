@@ -9,6 +9,7 @@
 
 #include <algorithm>
 #include <deque>
+#include <map>
 #include <random>
 #include <set>
 

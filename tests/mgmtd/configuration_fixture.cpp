@@ -1,0 +1,51 @@
+#include "tests/mgmtd/configuration_fixture.h"
+
+namespace mgmtd_test
+{
+
+using namespace ovhost;
+
+void ConfigurationTest::restart()
+{
+    configuration_.reset();
+    configuration_.emplace(state_.path());
+    configuration_->start();
+}
+
+void ConfigurationTest::set(const std::string &node, bn_type type, const std::string &value)
+{
+    EXPECT_EQ(configuration_->candidate().set(node, type, value), std::nullopt);
+}
+
+void ConfigurationTest::erase(const std::string &node)
+{
+    EXPECT_EQ(configuration_->candidate().erase(node), std::nullopt);
+}
+
+std::string ConfigurationTest::commit()
+{
+    const CommitReport report = configuration_->commit("");
+    EXPECT_THAT(report.warnings, testing::IsEmpty());
+    if (report.accepted()) {
+        return report.outcome == CommitOutcome::committed ? "committed" : "unchanged";
+    }
+    std::string text;
+    for (const std::string &refusal : refusals_of(report.refusals)) {
+        text += refusal + "\n";
+    }
+    return text;
+}
+
+std::string ConfigurationTest::commit_in_vain()
+{
+    const std::string text = commit();
+    configuration_->discard();
+    return text;
+}
+
+std::string ConfigurationTest::value(const std::string &node) const
+{
+    return value_in(configuration_->running(), node);
+}
+
+} // namespace mgmtd_test

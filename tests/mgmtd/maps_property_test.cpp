@@ -1,0 +1,309 @@
+// Random commits of maps and ACLs against a model of the references: which records there must be
+// after each commit, and which commits must be refused.
+
+#include "tests/mgmtd/map_fixture.h"
+
+#include <map>
+#include <random>
+#include <set>
+
+namespace
+{
+
+using namespace ovhost;
+using namespace mgmtd_test;
+
+constexpr unsigned most_maps = 10;
+
+struct EntryName {
+    std::size_t kind = 0;
+    std::string map;
+    unsigned priority = 0;
+
+    auto operator<=>(const EntryName &) const = default;
+};
+
+using MapName = std::pair<std::size_t, std::string>;
+
+/// Maps and ACLs as they are, or as a commit wants them.
+struct Policy {
+    std::set<std::string> acls;
+    std::set<MapName> maps;
+    /// The ACL of each entry: nothing when it has no such node, empty when it names none.
+    std::map<EntryName, std::optional<std::string>> entries;
+
+    bool operator==(const Policy &) const = default;
+
+    [[nodiscard]] std::string acl_of(const EntryName &entry) const
+    {
+        const auto found = entries.find(entry);
+        return found != entries.end() ? found->second.value_or("") : "";
+    }
+};
+
+/// A record: the ACL, and the entry that it is about.
+using Record = std::pair<std::string, EntryName>;
+
+bool is_default(const EntryName &entry)
+{
+    return entry.priority == 65535;
+}
+
+class PolicyModel
+{
+  public:
+    /// False, and nothing is changed, when the commit must be refused.
+    bool commit(const Policy &wanted)
+    {
+        if (names_missing_acl(wanted) || has_too_many_maps(wanted) || removes_used_acl(wanted)) {
+            return false;
+        }
+        std::set<EntryName> all;
+        for (const auto &[entry, acl] : policy.entries) {
+            all.insert(entry);
+        }
+        for (const auto &[entry, acl] : wanted.entries) {
+            all.insert(entry);
+        }
+        for (const EntryName &entry : all) {
+            if (!is_default(entry)) {
+                follow(entry, wanted);
+            }
+        }
+        std::erase_if(records,
+                      [&](const Record &record) { return !wanted.acls.contains(record.first); });
+        policy = wanted;
+        return true;
+    }
+
+    Policy policy;
+    std::set<Record> records;
+
+  private:
+    /// Whether the commit sets an entry's ACL.
+    bool is_set(const EntryName &entry, const Policy &wanted) const
+    {
+        const auto before = policy.entries.find(entry);
+        const auto after = wanted.entries.find(entry);
+        return after->second && (before == policy.entries.end() || before->second != after->second);
+    }
+
+    bool names_missing_acl(const Policy &wanted) const
+    {
+        return std::ranges::any_of(wanted.entries, [&](const auto &entry) {
+            const std::string acl = entry.second.value_or("");
+            return !acl.empty() && !wanted.acls.contains(acl) && is_set(entry.first, wanted);
+        });
+    }
+
+    bool has_too_many_maps(const Policy &wanted) const
+    {
+        return std::ranges::any_of(wanted.maps, [&](const MapName &map) {
+            const auto of_kind = [&](const MapName &other) { return other.first == map.first; };
+            return map_kinds[map.first].type != MAP_TYPE_SEC && !policy.maps.contains(map) &&
+                   std::ranges::count_if(policy.maps, of_kind) >= most_maps;
+        });
+    }
+
+    bool removes_used_acl(const Policy &wanted) const
+    {
+        return std::ranges::any_of(records, [&](const Record &record) {
+            return !wanted.acls.contains(record.first) &&
+                   wanted.acl_of(record.second) == record.first;
+        });
+    }
+
+    /// What the commit makes of the records of one entry.
+    void follow(const EntryName &entry, const Policy &wanted)
+    {
+        const std::string before = policy.acl_of(entry);
+        const auto after = wanted.entries.find(entry);
+        if (after == wanted.entries.end()) {
+            records.erase({before, entry});
+        } else if (is_set(entry, wanted)) {
+            records.erase({before, entry});
+            if (!after->second->empty()) {
+                records.insert({*after->second, entry});
+            }
+        } // without its ACL's node alone, an entry keeps its record
+    }
+};
+
+class RandomMaps : public MapTest
+{
+  protected:
+    unsigned below(unsigned limit) { return static_cast<unsigned>(random_() % limit); }
+
+    std::string any_acl() { return "a" + std::to_string(below(8)); }
+
+    MapName any_map() { return {below(map_kinds.size()), "m" + std::to_string(below(12))}; }
+
+    EntryName any_entry()
+    {
+        const MapName map = any_map();
+        const unsigned priority = below(5);
+        return {map.first, map.second, priority == 0 ? 65535 : priority * 10};
+    }
+
+    void change_acls(Policy &wanted)
+    {
+        for (unsigned i = below(4); i > 0; --i) {
+            const std::string acl = any_acl();
+            if (below(3) != 0) {
+                wanted.acls.insert(acl);
+            } else {
+                wanted.acls.erase(acl);
+                // Often all that name it let go of it in the same commit.
+                for (auto &[entry, named] : wanted.entries) {
+                    if (named == acl && below(8) != 0) {
+                        named = below(2) == 0 ? any_acl() : "";
+                    }
+                }
+            }
+        }
+    }
+
+    void change_entry(Policy &wanted)
+    {
+        const EntryName entry = any_entry();
+        wanted.maps.insert({entry.kind, entry.map});
+        switch (below(6)) {
+        case 0:
+            wanted.entries.erase(entry);
+            break;
+        case 1:
+            wanted.entries[entry] = "";
+            break;
+        case 2:
+            wanted.entries[entry] = std::nullopt;
+            break;
+        default:
+            wanted.entries[entry] = any_acl();
+        }
+    }
+
+    Policy any_policy()
+    {
+        Policy wanted = model_.policy;
+        for (unsigned i = below(10); i > 0; --i) {
+            change_entry(wanted);
+        }
+        if (below(4) == 0) {
+            const MapName map = any_map();
+            wanted.maps.erase(map);
+            std::erase_if(wanted.entries, [&map](const auto &entry) {
+                return entry.first.kind == map.first && entry.first.map == map.second;
+            });
+        }
+        change_acls(wanted);
+        return wanted;
+    }
+
+    static std::string node_of(const EntryName &entry)
+    {
+        return entry_node(map_kinds[entry.kind], entry.map, std::to_string(entry.priority));
+    }
+
+    static std::string acl_node_of(const EntryName &entry)
+    {
+        return matched(map_kinds[entry.kind], entry.map, std::to_string(entry.priority), "acl");
+    }
+
+    void edit_maps(const Policy &wanted)
+    {
+        const Policy &present = model_.policy;
+        for (const auto &[kind, map] : present.maps) {
+            if (!wanted.maps.contains({kind, map})) {
+                erase(map_node(map_kinds[kind], map));
+            }
+        }
+        for (const auto &[kind, map] : wanted.maps) {
+            if (!present.maps.contains({kind, map})) {
+                set(map_node(map_kinds[kind], map), map);
+            }
+        }
+        for (const auto &[entry, named] : present.entries) {
+            if (!wanted.entries.contains(entry) && wanted.maps.contains({entry.kind, entry.map})) {
+                erase(node_of(entry));
+            }
+        }
+    }
+
+    void edit_entries(const Policy &wanted)
+    {
+        for (const auto &[entry, named] : wanted.entries) {
+            const auto present = model_.policy.entries.find(entry);
+            const bool is_new = present == model_.policy.entries.end();
+            if (is_new) {
+                set(node_of(entry), bt_uint16, std::to_string(entry.priority));
+            }
+            if (named) {
+                set(acl_node_of(entry), *named);
+            } else if (!is_new && present->second) {
+                erase(acl_node_of(entry));
+            }
+        }
+    }
+
+    void edit(const Policy &wanted)
+    {
+        edit_maps(wanted);
+        edit_entries(wanted);
+        for (const std::string &name : model_.policy.acls) {
+            if (!wanted.acls.contains(name)) {
+                erase(acl(name));
+            }
+        }
+        for (const std::string &name : wanted.acls) {
+            set(acl(name), name);
+        }
+    }
+
+    void expect_agreement() const
+    {
+        std::set<std::string> expected;
+        for (const auto &[acl_name, entry] : model_.records) {
+            expected.insert(acl_name + "/" + map_kinds[entry.kind].key + "/" + entry.map + "/" +
+                            std::to_string(entry.priority));
+        }
+        const std::vector<std::string> present = records();
+        ASSERT_EQ(std::set(present.begin(), present.end()), expected);
+    }
+
+    std::mt19937 random_{20240307};
+    PolicyModel model_;
+};
+
+TEST_F(RandomMaps, HaveTheRecordsThatTheModelHas)
+{
+    G_daemon_log_level = 2;
+    unsigned refused = 0;
+    unsigned stale = 0;
+    for (unsigned step = 0; step < 600; ++step) {
+        SCOPED_TRACE(step);
+        const Policy wanted = any_policy();
+        edit(wanted);
+        const std::string outcome = commit();
+        const bool is_possible = model_.commit(wanted);
+        ASSERT_EQ(outcome == "committed" || outcome == "unchanged", is_possible) << outcome;
+        refused += is_possible ? 0 : 1;
+        configuration_->discard();
+        expect_agreement();
+        stale += std::ranges::any_of(model_.records, [this](const Record &record) {
+            return model_.policy.acl_of(record.second) != record.first;
+        });
+        if (step % 100 == 99) {
+            restart();
+            expect_agreement();
+        }
+        if (HasFatalFailure() || HasNonfatalFailure()) {
+            return;
+        }
+    }
+    EXPECT_GT(model_.records.size(), 20U);
+    EXPECT_GT(refused, 50U) << "the test must come to where commits are refused";
+    EXPECT_LT(refused, 450U);
+    EXPECT_GT(stale, 100U) << "and to records that nothing stands behind any more";
+}
+
+} // namespace
