@@ -63,11 +63,12 @@ std::uint32_t required_number(const json &request, const char *name)
 
 [[noreturn]] void throw_unknown(std::uint64_t number, std::uint64_t first, std::uint64_t last)
 {
-    const std::string range = first == last ? std::to_string(last)
-                                            : std::to_string(first) + " to " + std::to_string(last);
+    const std::string held = first == 0      ? "it is empty"
+                             : first == last ? "it goes back to commit " + std::to_string(last)
+                                             : "it goes from commit " + std::to_string(first) +
+                                                   " to commit " + std::to_string(last);
     throw RequestError(error_code::not_found,
-                       "there is no commit " + std::to_string(number) + " in the history" +
-                           (first == 0 ? ", which is empty" : ", which has " + range));
+                       "there is no commit " + std::to_string(number) + " in the history: " + held);
 }
 
 /// A commit after which the configuration is known.

@@ -1,6 +1,7 @@
 #include "host/ovctl/command_table.h"
 
 #include "host/ovctl/render.h"
+#include "host/ovctl/render_history.h"
 #include "host/ovctl/render_maps.h"
 #include "host/ovctl/render_tunnels.h"
 #include "host/ovctl/text_input.h"
@@ -48,7 +49,27 @@ constexpr ArgumentSpec upgrade_arguments[] = {
 };
 
 constexpr ArgumentSpec commit_arguments[] = {
-    {text, "comment", "A remark for mgmtd's log"},
+    {text, "comment", "A remark for the history and for mgmtd's log"},
+    {number, "confirm", "Undo the commit after so many seconds unless it is confirmed"},
+};
+
+constexpr ArgumentSpec diff_arguments[] = {
+    {optional, "from", "A commit: what has changed since"},
+    {optional, "to", "Another commit, to which the changes are listed"},
+};
+
+constexpr ArgumentSpec history_arguments[] = {
+    {number, "limit", "How many commits to list (20)"},
+};
+
+constexpr ArgumentSpec show_commit_arguments[] = {
+    {positional, "number", "The commit's number"},
+};
+
+constexpr ArgumentSpec rollback_arguments[] = {
+    {positional, "number", "The number of a commit in the history"},
+    {text, "comment", "A remark for the history and for mgmtd's log"},
+    {number, "confirm", "Undo the rollback after so many seconds unless it is confirmed"},
 };
 
 constexpr ArgumentSpec tunnel_arguments[] = {
@@ -95,12 +116,45 @@ json load_request(const Arguments &arguments)
     return {{"text", read_text(file)}, {"source", file == "-" ? "standard input" : file}};
 }
 
+/// What the commands that commit have in common.
 json commit_request(const Arguments &arguments)
 {
-    const auto comment = arguments.find("comment");
-    if (comment == arguments.end())
+    json request = json::object();
+    if (const auto comment = arguments.find("comment"); comment != arguments.end())
+        request["comment"] = checked_utf8(comment->second, "the comment");
+    if (const auto confirm = arguments.find("confirm"); confirm != arguments.end())
+        request["confirm"] = checked_number(confirm->second, "--confirm");
+    return request;
+}
+
+json rollback_request(const Arguments &arguments)
+{
+    json request = commit_request(arguments);
+    request["number"] = checked_number(arguments.at("number"), "the commit");
+    return request;
+}
+
+json diff_request(const Arguments &arguments)
+{
+    json request = json::object();
+    if (const auto from = arguments.find("from"); from != arguments.end())
+        request["after"] = checked_number(from->second, "FROM");
+    if (const auto to = arguments.find("to"); to != arguments.end())
+        request["to"] = checked_number(to->second, "TO");
+    return request;
+}
+
+json history_request(const Arguments &arguments)
+{
+    const auto limit = arguments.find("limit");
+    if (limit == arguments.end())
         return json::object();
-    return {{"comment", checked_utf8(comment->second, "the comment")}};
+    return {{"limit", checked_number(limit->second, "--limit")}};
+}
+
+json show_commit_request(const Arguments &arguments)
+{
+    return {{"what", "commit"}, {"number", checked_number(arguments.at("number"), "the commit")}};
 }
 
 json show_mode_request(const Arguments &)
@@ -166,14 +220,21 @@ constexpr Command table[] = {
     {"commit", "Make the candidate the running configuration",
      "ovctl commit --comment \"router mode for the new site\"", commit_arguments, "commit",
      commit_request, render_commit, "the commit"},
-    {"diff",
-     "List what the candidate changes: + added, - removed, ~ modified",
-     "ovctl diff",
+    {"diff", "List what the candidate, or commits, change: + added, - removed, ~ modified",
+     "ovctl diff 3 5", diff_arguments, "diff", diff_request, render_diff, "the query"},
+    {"history", "List the last commits, the newest first", "ovctl history --limit 5",
+     history_arguments, "history", history_request, render_history, "the query"},
+    {"rollback", "Commit the configuration as it was after an earlier commit",
+     "ovctl rollback 3 --confirm 60", rollback_arguments, "rollback", rollback_request,
+     render_commit, "the rollback"},
+    {"confirm",
+     "Keep the commits that would be undone",
+     "ovctl confirm",
      {},
-     "diff",
+     "confirm",
      no_arguments,
-     render_diff,
-     "the query"},
+     render_confirmation,
+     "the confirmation"},
     {"discard",
      "Drop the changes of the candidate",
      "ovctl discard",
@@ -195,6 +256,8 @@ constexpr Command table[] = {
      no_arguments,
      render_status,
      "the query"},
+    {"show commit", "Print a commit of the history with its changes", "ovctl show commit 3",
+     show_commit_arguments, "show", show_commit_request, render_recorded_commit, "the query"},
     {"show mode",
      "Print the deployment mode and what follows from it",
      "ovctl show mode",

@@ -18,7 +18,9 @@ using Arguments = std::map<std::string, std::string>;
 struct ArgumentSpec {
     enum class Kind {
         positional, ///< always needed
+        optional,   ///< positional too, may be left out
         text,       ///< --name TEXT
+        number,     ///< --name N
         flag,       ///< --name
     };
 

@@ -135,9 +135,14 @@ class CommandLine
                 ->option_text(upper(name))
                 ->required();
             return;
+        case ArgumentSpec::Kind::optional:
+            command.add_option_function<std::string>(name, store, argument.help)
+                ->option_text("[" + upper(name) + "]");
+            return;
         case ArgumentSpec::Kind::text:
+        case ArgumentSpec::Kind::number:
             command.add_option_function<std::string>("--" + name, store, argument.help)
-                ->option_text("TEXT");
+                ->option_text(argument.kind == ArgumentSpec::Kind::text ? "TEXT" : "N");
             return;
         case ArgumentSpec::Kind::flag:
             command.add_flag_callback(

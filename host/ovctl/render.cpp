@@ -1,5 +1,6 @@
 #include "host/ovctl/render.h"
 
+#include "host/ovctl/render_history.h"
 #include "host/ovctl/render_parts.h"
 #include "host/support/printable.h"
 
@@ -113,6 +114,7 @@ void render_commit(const json &result, std::ostream &out)
 {
     print_warnings(result, out);
     print_commit(result, count_of(result, "changes"), out);
+    render_wait(result, out);
 }
 
 void render_diff(const json &result, std::ostream &out)
@@ -148,6 +150,7 @@ void render_status(const json &result, std::ostream &out)
     print_fact(out, "candidate changes", std::to_string(count_of(result, "candidate_changes")));
     for (const json &peer : result.at("peers"))
         print_fact(out, "peer", describe_peer(peer));
+    render_wait(result, out);
 }
 
 void render_mode(const json &result, std::ostream &out)
