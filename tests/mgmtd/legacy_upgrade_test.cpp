@@ -271,7 +271,7 @@ TEST_F(LegacyUpgradeTest, RefusesNamesThatTheLibraryCuts)
     EXPECT_THAT(upgrade(entry_text(longest, {"acl,string,a1", "application,string,web"})),
                 ElementsAre("0/1"));
     EXPECT_THAT(nodes(), ElementsAre(longest + "/match/0/acl string a1"));
-    for (const std::size_t length : {195, 256, 600}) {
+    for (const std::size_t length : {195UL, 256UL, 600UL}) {
         candidate_ = Candidate();
         const std::string entry = route_maps + "/" + std::string(length, 'm') + "/prio/10";
         EXPECT_THAT(upgrade(entry_text(entry, {"acl,string,a1", "application,string,web"})),
