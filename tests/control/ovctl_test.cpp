@@ -487,6 +487,123 @@ TEST_F(OvctlTest, ARefusedCommitNamesEveryNodeAndModule)
                                         "  /c: no such mode\n"}));
 }
 
+TEST_F(OvctlTest, ShowMapsPrintsAnEntryPerLine)
+{
+    answer_with({{"maps",
+                  {{{"kind", "route-map"},
+                    {"name", "w\xc3\xa4n"},
+                    {"entries",
+                     {{{"priority", "10"}, {"acl", "a1"}, {"matchstr", nullptr}},
+                      {{"priority", "20"}, {"acl", nullptr}, {"matchstr", "dst_port:80"}},
+                      {{"priority", "30"}, {"acl", "a2"}, {"matchstr", "any"}},
+                      {{"priority", "65535"}, {"acl", nullptr}, {"matchstr", nullptr}}}}},
+                   {{"kind", "QoS-map"}, {"name", "empty"}, {"entries", json::array()}}}}});
+    EXPECT_EQ(ask({"show", "maps"}), (Outcome{0,
+                                              "KIND       MAP    PRIORITY  MATCH\n"
+                                              "route-map  w\xc3\xa4n    10        acl a1\n"
+                                              "route-map  w\xc3\xa4n    20        dst_port:80\n"
+                                              "route-map  w\xc3\xa4n    30        acl a2, any\n"
+                                              "route-map  w\xc3\xa4n    65535     -\n"
+                                              "QoS-map    empty  -         -\n",
+                                              ""}));
+    EXPECT_EQ(request(), (json{{"command", "show"}, {"what", "maps"}}));
+    answer_with({{"maps", json::array()}});
+    EXPECT_EQ(ask({"show", "maps"}), (Outcome{0, "no maps\n", ""}));
+}
+
+TEST_F(OvctlTest, ShowAclPrintsItsEntriesAndUsers)
+{
+    answer_with({{"name", "a1"},
+                 {"entries",
+                  {{{"number", "10"},
+                    {"fields",
+                     {{{"name", "matchstr"}, {"value", "dst_port:80"}},
+                      {{"name", "protocol"}, {"value", "tcp"}}}}},
+                   {{"number", "20"}, {"fields", json::array()}}}},
+                 {"references",
+                  {{{"kind", "route-map"}, {"map", "m1"}, {"priority", "10"}},
+                   {{"kind", "sec-map"}, {"map", "z1"}, {"priority", "5"}}}}});
+    EXPECT_EQ(ask({"show", "acl", "a1"}), (Outcome{0,
+                                                   "name                a1\n"
+                                                   "entry 10            matchstr dst_port:80\n"
+                                                   "                    protocol tcp\n"
+                                                   "entry 20            nothing set\n"
+                                                   "used by             route-map m1, entry 10\n"
+                                                   "                    sec-map z1, entry 5\n",
+                                                   ""}));
+    EXPECT_EQ(request(), (json{{"command", "show"}, {"what", "acl"}, {"name", "a1"}}));
+    answer_with({{"name", "a2"}, {"entries", json::array()}, {"references", json::array()}});
+    EXPECT_EQ(ask({"show", "acl", "a2"}), (Outcome{0,
+                                                   "name                a2\n"
+                                                   "used by             no map\n",
+                                                   ""}));
+}
+
+TEST_F(OvctlTest, ShowAclOfNoneIsRefused)
+{
+    refuse_with({"not-found", "there is no ACL \"a3\""});
+    EXPECT_EQ(ask({"show", "acl", "a3"}),
+              (Outcome{1, "", "mgmtd refused the query: there is no ACL \"a3\"\n"}));
+}
+
+TEST_F(OvctlTest, ShowReferencesPrintsAList)
+{
+    answer_with({{"references",
+                  {{{"acl", "a1"}, {"kind", "route-map"}, {"map", "m1"}, {"priority", "10"}},
+                   {{"acl", "a22"}, {"kind", "nat-map"}, {"map", "n1"}, {"priority", "5"}}}}});
+    EXPECT_EQ(ask({"show", "references"}), (Outcome{0,
+                                                    "ACL  KIND       MAP  PRIORITY\n"
+                                                    "a1   route-map  m1   10\n"
+                                                    "a22  nat-map    n1   5\n",
+                                                    ""}));
+    EXPECT_EQ(request(), (json{{"command", "show"}, {"what", "references"}, {"check", false}}));
+    answer_with({{"references", json::array()}});
+    EXPECT_EQ(ask({"show", "references"}), (Outcome{0, "no references\n", ""}));
+}
+
+TEST_F(OvctlTest, ShowReferencesFailsWhenACheckFindsSomething)
+{
+    answer_with({{"records", 1}, {"faults", json::array()}});
+    EXPECT_EQ(ask({"show", "references", "--check"}),
+              (Outcome{0, "1 record, 0 inconsistencies\n", ""}));
+    EXPECT_EQ(request(), (json{{"command", "show"}, {"what", "references"}, {"check", true}}));
+    answer_with({{"records", 2},
+                 {"faults",
+                  {{{"acl", "a1"},
+                    {"kind", "route-map"},
+                    {"map", "m1"},
+                    {"priority", "10"},
+                    {"message", "there is a record, but the entry names no ACL"}}}}});
+    EXPECT_EQ(ask({"show", "references", "--check"}),
+              (Outcome{1,
+                       "route-map m1, entry 10, ACL a1: there is a record, but the entry names no "
+                       "ACL\n2 records, 1 inconsistency\n",
+                       ""}));
+    EXPECT_EQ(ask({"--json", "show", "references", "--check"}),
+              (Outcome{1,
+                       R"({"ok":true,"result":{"faults":[{"acl":"a1","kind":"route-map",)"
+                       R"("map":"m1","message":"there is a record, but the entry names no ACL",)"
+                       R"("priority":"10"}],"records":2}})"
+                       "\n",
+                       ""}));
+}
+
+TEST_F(OvctlTest, ARefusalOfSeveralLinesKeepsThem)
+{
+    refuse_with({"refused",
+                 "one check refuses",
+                 {{"/a/b", "Cannot delete it.\n  Please wait.\n  And\x1b[31m more.", "acl", 0},
+                  {"/c", "Unknown protocol x.\n", "acl", 0},
+                  {"/d", "", "acl", 0}}});
+    EXPECT_EQ(ask({"commit"}), (Outcome{1, "",
+                                        "mgmtd refused the commit:\n"
+                                        "  /a/b: Cannot delete it. (acl)\n"
+                                        "    Please wait.\n"
+                                        "    And\\x1b[31m more.\n"
+                                        "  /c: Unknown protocol x. (acl)\n"
+                                        "  /d:  (acl)\n"}));
+}
+
 TEST_F(OvctlTest, ARefusedFileNamesItsLines)
 {
     refuse_with({"bad-lines",
