@@ -31,9 +31,13 @@ TEST_F(Schema, KnowsTheTypeOfEachOfItsNodes)
         const char *type;
     };
     const Row rows[] = {
+        {"/ov/iflabels/config/lan/inside", "string"},
         {"/ov/model/config/name", "string"},
         {"/ov/model/limits/max_interfaces", "uint32"},
         {"/ov/model/limits/max_tunnels", "uint32"},
+        {"/ov/tunneld/app/config/1/name", "string"},
+        {"/ov/tunneld/net/interface/tunnel/vlan/config/vlan7", "string"},
+        {"/ov/tunneld/net/routes/config/ipv4/prefix/p/nhop/n/preferred_if", "string"},
         {"/ov/tunneld/system/config/10g", "bool"},
         {"/ov/tunneld/system/config/bonding", "bool"},
         {"/ov/tunneld/system/config/limits/another", "uint32"},
@@ -49,6 +53,43 @@ TEST_F(Schema, KnowsTheTypeOfEachOfItsNodes)
         expected.push_back(std::string(row.node) + ": must be of type " + row.type + " (schema)");
     }
     EXPECT_EQ(refusals(), expected);
+}
+
+TEST_F(Schema, KnowsTheNodesOfMapsAndAcls)
+{
+    struct Row {
+        const char *node;
+        const char *type;
+    };
+    // Every kind of map, with those nodes that its module looks at.
+    const Row rows[] = {
+        {"/ov/tunneld/acl/config/a1", "string"},
+        {"/ov/tunneld/acl/config/a1/entry/10", "uint16"},
+        {"/ov/tunneld/acl/config/a1/entry/10/application", "string"},
+        {"/ov/tunneld/acl/config/a1/entry/10/matchstr", "string"},
+        {"/ov/tunneld/acl/config/a1/entry/10/protocol", "string"},
+        {"/ov/tunneld/acl/config/a1/rmap/m1/prio/10", "uint32"},
+        {"/ov/tunneld/acl/config/a1/secmap/m1/prio/10", "uint32"},
+        {"/ov/tunneld/nat_map/config/map/m1", "string"},
+        {"/ov/tunneld/nat_map/config/map/m1/prio/10", "uint16"},
+        {"/ov/tunneld/opt_map/config/map/m1/prio/10/match/0/acl", "string"},
+        {"/ov/tunneld/qos_map/config/map/m1/prio/10/match/0/matchstr", "string"},
+        {"/ov/tunneld/route_map/config/map/m1/prio/10/set/0/auto_mod", "string"},
+        {"/ov/tunneld/route_map/config/map/m1/prio/10/set/0/auto_prefif", "string"},
+        {"/ov/tunneld/sec_map/config/map/map1/z1", "string"},
+        {"/ov/tunneld/sec_map/config/map/map1/z1/prio/10", "uint16"},
+        {"/ov/tunneld/sec_map/config/map/map1/z1/prio/10/match/acl", "string"},
+        {"/ov/tunneld/sec_map/config/map/map1/z1/prio/10/match/matchstr", "string"},
+        {"/ov/tunneld/stats_map/config/map/m1/prio/10/match/0/application", "string"},
+    };
+    for (const Row &row : rows) {
+        set(row.node, bt_ipv4addr, "192.0.2.1");
+    }
+    const std::vector<std::string> present = refusals();
+    for (const Row &row : rows) {
+        EXPECT_THAT(present, testing::Contains(std::string(row.node) + ": must be of type " +
+                                               row.type + " (schema)"));
+    }
 }
 
 TEST_F(Schema, LeavesOtherNodesAlone)
