@@ -5,6 +5,7 @@
 #ifndef ORVALE_MD_TUNNELD_TUNNEL_COMMON_H
 #define ORVALE_MD_TUNNELD_TUNNEL_COMMON_H
 
+#include "framework/md_commit.h"
 #include "framework/mdb_db.h"
 #include "framework/typed_arrays.h"
 #include "orvale/ov_api.h"
@@ -213,6 +214,88 @@ OV_NODISCARD OV_API int md_get_app_num_rules(const mdb_db *db, const char *app_n
  * Returns 0; 14001 when an argument is null or a rule has no name; the code of a query or array.
  */
 OV_NODISCARD OV_API int md_get_custom_app_names(const mdb_db *db, tstr_array **names);
+
+/*
+ * Who uses an interface. A usage is the full name of the node that names it.
+ */
+
+/*
+ * The usages of an interface by WCCP service groups ("/ov/wccpd/wccp/srv_grp/config/X/interface")
+ * and then by VRRP entries ("/ov/redd/net/interface/vrrp/config/X"), both in the database's order.
+ * Names are compared as ts_equal_str does it.
+ *
+ * usages  receives a new array, empty when there are none, which the caller releases with
+ *         tstr_array_free; null on failure
+ * Returns 0; 14001 when an argument is null or memory has run out; the code of a query or array.
+ */
+OV_NODISCARD OV_API int md_interface_usage_check(const mdb_db *db, char *ifname,
+                                                 tstr_array **usages);
+
+/*
+ * What a usage is called for the user: "router interface", "wccp group NAME" or "vrrp interface".
+ *
+ * usertext  receives a new string, which the caller releases with ts_free; null when the name is no
+ *           usage (not an error), and on failure
+ * Returns 0; 14001 when an argument is null; the code of bn_binding_name_to_parts or
+ * ts_new_sprintf.
+ */
+OV_NODISCARD OV_API int md_interface_usage_to_usertext(const char *usage, tstring **usertext);
+
+/*
+ * Both in one: what the usages of an interface are called, in their order.
+ *
+ * usertexts  receives a new array, empty when there are none, which the caller releases with
+ *            tstr_array_free; null on failure
+ * Returns as these two.
+ */
+OV_NODISCARD OV_API int md_interface_usage_check_usertext(const mdb_db *db, char *ifname,
+                                                          tstr_array **usertexts);
+
+/*
+ * The names of the VLAN interfaces, children of "/ov/tunneld/net/interface/tunnel/vlan/config".
+ *
+ * ifnames  receives a new array, which the caller releases with tstr_array_free; null when the
+ *          database has no list of them to give (not an error), and on failure
+ * Returns 0; 14001 when an argument or a name is null; the code of a query or array.
+ */
+OV_NODISCARD OV_API int md_get_vlan_interfaces(const mdb_db *db, tstr_array **ifnames);
+
+/*
+ * Sets an interface's flag "/net/interface/config/NAME/enable". One that has no node
+ * "/net/interface/config/NAME" is left alone; both names are cut at 255 characters.
+ *
+ * Returns 0; 14001 when a pointer is null; the code of the query or write.
+ */
+OV_NODISCARD OV_API int md_set_if_enable(mdb_db *db, const char *ifname, tbool is_enabled);
+
+/*
+ * Removes the next hops of all route prefixes
+ * ("/ov/tunneld/net/routes/config/ipv4/prefix/X/nhop/Y") that lie in the subnet of an address, and
+ * the prefixes that are left with none by it.
+ *
+ * A prefix's name is escaped for the node's name without a terminating NUL: one that is shorter
+ * than another before it ends in what that one has left, and is then not found. Node names are cut
+ * at 199 (of a prefix's next hops) and 255 characters.
+ *
+ * commit     may be null
+ * ipa        an IPv4 address
+ * masklen    length of the subnet's prefix in bits; mgmt_is_same_subnet_using_masklen says what 0
+ *            and more than 32 mean
+ * ret_count  may be null; receives the number of next hops removed, 0 on failure
+ * Returns 0; 14001 when db, ipa or a name is null; 14002 for a prefix whose escaped name has more
+ * than 255 characters; the code of a query or write. What was removed before a failure stays so.
+ */
+OV_NODISCARD OV_API int md_tunneld_delete_dproutes(md_commit *commit, mdb_db *db, const char *ipa,
+                                                   uint8 masklen, uint32 *ret_count);
+
+/*
+ * Appends a line to the file of the alarms of software upgrades,
+ * "/var/opt/tms/output/upgrade_alarms.txt", which is created when it is not there. Whether the line
+ * got there is not known: an error in writing shows nowhere.
+ *
+ * Returns 0; 14001 when alarm_str is null; 14010 when the file cannot be opened.
+ */
+OV_NODISCARD OV_API int md_tunneld_write_sw_upgrade_alarm(const char *alarm_str);
 
 OV_C_END
 

@@ -25,6 +25,9 @@ class owner
 
     T *get() const { return object_; }
 
+    // For an operation that takes the object over and nulls the pointer to it.
+    T **address() { return &object_; }
+
     // Hands the object over to a caller.
     T *release()
     {

@@ -17,6 +17,7 @@
 #include "orvale/md_db_default.h"
 #include "orvale/md_tunbin_ht.h"
 #include "orvale/md_tunneld_defs.h"
+#include "orvale/md_utils.h"
 #include "orvale/md_xmap_common.h"
 #include "orvale/opkt_proto.h"
 #include "orvale/ov_xmap.h"
@@ -142,6 +143,7 @@ VALUE_IS(MAP_TYPE_SEC, 5);
 VALUE_IS(MAP_TYPE_RTMAP, 6);
 VALUE_IS(MAP_TYPE_DNS_PROXY, 7);
 VALUE_IS(MD_XMAP_REFUSED, 80000);
+VALUE_IS(MD_IFMGR_IFINDEX_BUDGET, 128);
 VALUE_IS(MD_XMAP_MATCHSTR_SIZE, 1024);
 
 #endif

@@ -17,6 +17,7 @@
 #include "orvale/md_event_common.h"
 #include "orvale/md_tunbin_ht.h"
 #include "orvale/md_tunneld_tunnel_common.h"
+#include "orvale/md_utils.h"
 #include "orvale/md_xmap_common.h"
 
 OV_C_BEGIN
@@ -134,6 +135,19 @@ int md_find_appname_in_acl_or_xxxmap(const char *appName, const mdb_db *, char *
                                      tstr_array **bnames);
 int md_get_app_num_rules(const mdb_db *, const char *app_name, int *num_rules);
 int md_get_custom_app_names(const mdb_db *, tstr_array **names);
+int md_interface_usage_check(const mdb_db *, char *ifname, tstr_array **usages);
+int md_interface_usage_to_usertext(const char *usage, tstring **usertext);
+int md_interface_usage_check_usertext(const mdb_db *, char *ifname, tstr_array **usertexts);
+int md_get_vlan_interfaces(const mdb_db *, tstr_array **ifnames);
+int md_set_if_enable(mdb_db *, const char *ifname, tbool is_enabled);
+int md_tunneld_delete_dproutes(md_commit *, mdb_db *, const char *ipa, uint8 masklen,
+                               uint32 *ret_count);
+int md_tunneld_write_sw_upgrade_alarm(const char *alarm_str);
+int md_delete_children(md_commit *, const mdb_db *, const char *parent, int *num);
+tbool md_ifmgr_can_interface_be_added(mdb_db_change_array *, const char *bpattern, int multiplier);
+void md_ifmgr_ifcount_inc(int);
+void md_ifmgr_ifcount_dec(int);
+int md_ifmgr_get_ifcount(void);
 int md_validate_proto(md_dbinfo *, const char *proto, tbool *found);
 int md_acl_ref_processing(mdb_db_change *, md_dbinfo *, int mtype);
 int md_acl_not_used_in_map(mdb_db_change *, md_dbinfo *, int mtype);

@@ -63,6 +63,8 @@ struct ExpectedTrace {
         const std::string text = with_code(line.text, code);
         if (line.kind == Kind::gated) {
             lines.push_back(gated_line(line.level, text));
+        } else if (line.kind == Kind::by_module) {
+            lines.push_back(module_line(line.level, line.function, text));
         } else if (line.kind == Kind::debug) {
             lines.push_back(debug_line(line.unit, line.function, text));
         } else if (line.kind == Kind::told) {

@@ -27,12 +27,13 @@ struct ExpectedLine {
         told,       // the code as by the bail rule, cancelled or not, without an error exit
         debug,      // a trace
         gated,      // ov_log_internal
+        by_module,  // the same with the function, by the module gate
     };
     Kind kind;
     std::string unit;
     std::string function;
     std::string text = {};
-    int level = 0; // of a gated line
+    int level = 0; // of a gated line, by either gate
     int code = 0;  // of a bail line; 0 means the failing code
 };
 

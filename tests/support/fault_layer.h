@@ -55,6 +55,10 @@ struct PlantedAnswers {
     bool without_time_info = false;
     // Of get_max_rmap_entries and its like.
     std::map<Operation, uint32> max_entries;
+    // Of ovif_get_ifcount.
+    std::optional<int> kernel_interfaces;
+    // mgmt_is_same_subnet_using_masklen says yes to everything.
+    bool one_subnet = false;
     // The library's so many-th call of tstr_array_get_str_quick, counted from 1, answers null; 0 is
     // none of them.
     unsigned null_text_at_call = 0;

@@ -210,6 +210,19 @@ TEST_F(FaultLayer, PlantsTheModelsNumbersOfEntries)
     EXPECT_GT(in_library(get_max_omap_entries), 3U);
 }
 
+TEST_F(FaultLayer, PlantsTheKernelsInterfacesAndASubnetOfAll)
+{
+    EXPECT_GT(in_library(ovif_get_ifcount), 0);
+    planted().kernel_interfaces = -5;
+    EXPECT_EQ(in_library(ovif_get_ifcount), -5);
+    const auto same_subnet = [] {
+        return in_library(mgmt_is_same_subnet_using_masklen, "any", "other", uint8{24}, uint8{24});
+    };
+    EXPECT_FALSE(same_subnet());
+    planted().one_subnet = true;
+    EXPECT_TRUE(same_subnet());
+}
+
 TEST_F(FaultLayer, PlantsANullTextInAList)
 {
     tstr_array *array = nullptr;

@@ -139,4 +139,25 @@ std::string taken(char *text)
     return copy;
 }
 
+std::string taken(tstring *text)
+{
+    std::string copy = text != nullptr ? ts_str(text) : "null";
+    ts_free(&text);
+    return copy;
+}
+
+std::string taken(tstr_array *array)
+{
+    if (array == nullptr) {
+        return "null";
+    }
+    std::string all = "[";
+    for (int32 i = 0; i < tstr_array_length_quick(array); ++i) {
+        all += i != 0 ? ", " : "";
+        all += tstr_array_get_str_quick(array, static_cast<uint32>(i));
+    }
+    tstr_array_free(&array);
+    return all + ']';
+}
+
 } // namespace ovtest

@@ -74,5 +74,9 @@ std::optional<std::string> read_file(const std::string &path);
 
 // A text that the library handed out, which is freed; "null" when there is none.
 std::string taken(char *text);
+std::string taken(tstring *text);
+
+// The same of an array: "[first, second]".
+std::string taken(tstr_array *array);
 
 } // namespace ovtest

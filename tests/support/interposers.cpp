@@ -203,6 +203,14 @@ auto answer_of(Real *real, Arguments... arguments)
         if (planted().without_time_info) {
             return;
         }
+    } else if constexpr (operation == Operation::ovif_get_ifcount) {
+        if (planted().kernel_interfaces) {
+            return *planted().kernel_interfaces;
+        }
+    } else if constexpr (operation == Operation::mgmt_is_same_subnet_using_masklen) {
+        if (planted().one_subnet) {
+            return tbool{true};
+        }
     } else if constexpr (gives_max_entries<operation>) {
         const auto found = planted().max_entries.find(operation);
         if (found != planted().max_entries.end()) {
