@@ -200,12 +200,13 @@ std::optional<std::string> ControlClient::read_line_until(Deadline deadline)
         std::array<pollfd, 2> watched{{{.fd = fd_.get(), .events = POLLIN, .revents = 0},
                                        // poll() passes over a negative descriptor.
                                        {.fd = wake_fd_, .events = POLLIN, .revents = 0}}};
-        const int ready = ::poll(watched.data(), watched.size(), milliseconds_left(deadline));
-        if (ready == 0 || watched[1].revents != 0)
+        const int ready = ::poll(watched.data(), watched.size(), patience_of_poll(deadline));
+        if (watched[1].revents != 0 || (ready == 0 && steady_clock::now() >= deadline))
             return std::nullopt;
+        tell_progress(told_.sent, told_.total);
         if (ready > 0)
             receive_piece();
-        else if (errno != EINTR)
+        else if (ready < 0 && errno != EINTR)
             throw ClientError(Kind::closed,
                               std::string("cannot wait for mgmtd: ") + std::strerror(errno));
     }
@@ -242,11 +243,34 @@ void ControlClient::send_line(std::string_view text)
         if (errno != EAGAIN && errno != EINTR)
             throw ClientError(Kind::closed,
                               std::string("mgmtd closed the connection: ") + std::strerror(errno));
+        tell_progress(sent, line.size());
         pollfd watched{.fd = fd_.get(), .events = POLLOUT, .revents = 0};
-        if (::poll(&watched, 1, milliseconds_left(deadline)) == 0)
+        if (::poll(&watched, 1, patience_of_poll(deadline)) == 0 && steady_clock::now() >= deadline)
             throw ClientError(Kind::timeout,
                               "mgmtd did not take the request within " + in_seconds(patience_));
     }
+    tell_progress(line.size(), line.size());
+}
+
+void ControlClient::tell_progress(std::size_t sent, std::size_t total)
+{
+    told_ = {.sent = sent, .total = total};
+    if (progress_)
+        progress_(told_);
+}
+
+bool ControlClient::is_woken() const
+{
+    pollfd watched{.fd = wake_fd_, .events = POLLIN, .revents = 0};
+    return ::poll(&watched, 1, 0) > 0;
+}
+
+/// Short waits when there is somebody to tell.
+int ControlClient::patience_of_poll(Deadline deadline) const
+{
+    constexpr int between_two_tellings = 100;
+    const int left = milliseconds_left(deadline);
+    return progress_ ? std::min(left, between_two_tellings) : left;
 }
 
 void ControlClient::shut_down_writing()

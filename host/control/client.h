@@ -11,6 +11,7 @@
 
 #include <chrono>
 #include <deque>
+#include <functional>
 #include <memory>
 #include <optional>
 #include <stdexcept>
@@ -41,6 +42,12 @@ class ClientError : public std::runtime_error
     Kind kind_;
 };
 
+/// How far a call is. All is sent: the daemon is at work on it.
+struct CallProgress {
+    std::size_t sent = 0;
+    std::size_t total = 0;
+};
+
 class ControlClient
 {
   public:
@@ -67,6 +74,15 @@ class ControlClient
     /// Lets a readable descriptor (a signal's, say) end read_event() early. It is not read from.
     void wake_on(int fd) { wake_fd_ = fd; }
 
+    /// Whether that descriptor is readable.
+    [[nodiscard]] bool is_woken() const;
+
+    /// Has `tell` called several times a second while a call is under way.
+    void on_progress(std::function<void(const CallProgress &)> tell)
+    {
+        progress_ = std::move(tell);
+    }
+
     /// For tools and tests that speak the protocol themselves. read_line() gives nothing in case of
     /// a timeout or a wake-up, and throws ClientError "closed" at the end of the stream.
     void send_line(std::string_view text);
@@ -81,10 +97,14 @@ class ControlClient
     std::optional<nlohmann::json> take_message(const std::string &line);
     std::optional<std::string> read_line_until(Deadline deadline);
     void receive_piece();
+    void tell_progress(std::size_t sent, std::size_t total);
+    [[nodiscard]] int patience_of_poll(Deadline deadline) const;
 
     UniqueFd fd_;
     int wake_fd_ = -1;
     Milliseconds patience_;
+    std::function<void(const CallProgress &)> progress_;
+    CallProgress told_;
     LineSplitter input_;
     std::deque<nlohmann::json> events_;
     // Why the daemon says it ends the connection, when it said so.

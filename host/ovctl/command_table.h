@@ -46,6 +46,9 @@ struct Command {
     /// Whether a result is itself bad news, so that the exit code is that of a refusal; null: none
     /// is.
     bool (*is_bad)(const nlohmann::json &result) = nullptr;
+    /// Whether it goes on with the events that mgmtd sends after the answer (follow.h): `render`
+    /// then prints those, and the answer says nothing.
+    bool follows = false;
 };
 
 [[nodiscard]] std::span<const Command> commands();

@@ -2,6 +2,7 @@
 
 #include "host/ovctl/render_history.h"
 #include "host/ovctl/render_parts.h"
+#include "host/ovctl/terminal.h"
 #include "host/support/printable.h"
 
 #include <nlohmann/json.hpp>
@@ -24,7 +25,8 @@ std::string changes(long count)
 void print_warnings(const json &result, std::ostream &out)
 {
     for (const json &warning : result.at("warnings"))
-        out << "warning: " << printable(warning.get_ref<const std::string &>()) << '\n';
+        out << styled(out, Style::warning, "warning:") << ' '
+            << printable(warning.get_ref<const std::string &>()) << '\n';
 }
 
 std::string yes_or_no(const json &object, const char *member)
@@ -65,7 +67,9 @@ void print_modification(const json &change, std::ostream &out)
     const auto side = [same_type](const json &node) {
         return same_type ? text_of(node, "value") : type_and_value(node);
     };
-    out << "~ " << text_of(change, "name") << ": " << side(before) << " -> " << side(after) << '\n';
+    const std::string line =
+        "~ " + text_of(change, "name") + ": " + side(before) + " -> " + side(after);
+    out << styled(out, Style::modified, line) << '\n';
 }
 
 void print_change(const json &change, std::ostream &out)
@@ -76,8 +80,9 @@ void print_change(const json &change, std::ostream &out)
         return;
     }
     const bool added = kind == "add";
-    out << (added ? "+ " : "- ") << text_of(change, "name") << ' '
-        << type_and_value(change.at(added ? "new" : "old")) << '\n';
+    const std::string line = (added ? "+ " : "- ") + text_of(change, "name") + " " +
+                             type_and_value(change.at(added ? "new" : "old"));
+    out << styled(out, added ? Style::added : Style::removed, line) << '\n';
 }
 
 void print_commit(const json &result, long change_count, std::ostream &out)

@@ -1,6 +1,7 @@
 #include "host/ovctl/render_error.h"
 
 #include "host/control/message.h"
+#include "host/ovctl/terminal.h"
 #include "host/support/printable.h"
 
 #include <nlohmann/json.hpp>
@@ -52,7 +53,8 @@ void print_detail(const ErrorDetail &detail, std::ostream &err)
 void render_refusal(const RequestError &error, const std::string &subject, std::ostream &err)
 {
     const bool failed = error.code() == error_code::internal;
-    err << (failed ? "mgmtd failed at " : "mgmtd refused ") << subject << ':';
+    const std::string verdict = (failed ? "mgmtd failed at " : "mgmtd refused ") + subject + ":";
+    err << styled(err, Style::error, verdict);
     // The details say all that the message sums up.
     if (error.details().empty())
         err << ' ' << printable(error.what());

@@ -2,6 +2,7 @@
 
 #include "host/ovctl/render.h"
 #include "host/ovctl/render_parts.h"
+#include "host/ovctl/terminal.h"
 
 #include <nlohmann/json.hpp>
 
@@ -68,7 +69,34 @@ void print_refusal(const json &object, std::ostream &out)
         out << "the last try to undo was refused: " << text_of(object, "undo_refusal") << '\n';
 }
 
+void print_stored_commit(const json &event, std::ostream &out)
+{
+    const json &commit = event.at("commit");
+    out << styled(out, Style::heading, "commit " + number_of(commit, "number")) << " by "
+        << text_of(commit.at("author"), "user") << " at " << time_of(commit) << ", "
+        << counted(count_of(commit, "changes"), "change", "changes");
+    if (const std::string comment = text_of(commit, "comment"); !comment.empty())
+        out << ": " << comment;
+    out << '\n';
+    if (event.at("changes").is_null())
+        out << "too many changes to show here: run ovctl show commit "
+            << number_of(commit, "number") << '\n';
+    else
+        render_diff(event, out);
+}
+
 } // namespace
+
+void render_event(const json &event, std::ostream &out)
+{
+    const auto &kind = event.at("kind").get_ref<const std::string &>();
+    if (kind == "commit")
+        print_stored_commit(event, out);
+    else if (kind == "gap")
+        out << styled(out, Style::warning, "missed") << ' '
+            << counted(count_of(event, "left_out"), "commit", "commits")
+            << ", which came faster than they were read: run ovctl history\n";
+}
 
 void render_wait(const json &result, std::ostream &out)
 {

@@ -1,10 +1,10 @@
 #include "host/ovctl/render_parts.h"
 
+#include "host/ovctl/table.h"
 #include "host/support/printable.h"
 
 #include <nlohmann/json.hpp>
 
-#include <algorithm>
 #include <iomanip>
 #include <ostream>
 
@@ -38,23 +38,15 @@ std::string text_or(const json &object, const char *member, const char *otherwis
     return object.at(member).is_null() ? otherwise : text_of(object, member);
 }
 
-std::size_t width_of(const std::string &text)
-{
-    return static_cast<std::size_t>(std::ranges::count_if(
-        text, [](char byte) { return (static_cast<unsigned char>(byte) & 0xc0) != 0x80; }));
-}
-
 void print_table(std::ostream &out, const TableRows &rows)
 {
-    std::vector<std::size_t> widths(rows.front().size());
-    for (const std::vector<std::string> &row : rows)
-        for (std::size_t i = 0; i < row.size(); ++i)
-            widths[i] = std::max(widths[i], width_of(row[i]));
-    for (const std::vector<std::string> &row : rows) {
-        for (std::size_t i = 0; i + 1 < row.size(); ++i)
-            out << row[i] << std::string(widths[i] - width_of(row[i]) + 2, ' ');
-        out << row.back() << '\n';
-    }
+    std::vector<Column> columns;
+    for (const std::string &heading : rows.front())
+        columns.push_back({.heading = heading});
+    Table table(std::move(columns));
+    for (auto row = rows.begin() + 1; row != rows.end(); ++row)
+        table.add(*row);
+    table.print(out);
 }
 
 } // namespace ovhost

@@ -26,11 +26,7 @@ namespace ovhost
 /// Names and values in two columns.
 void print_fact(std::ostream &out, const char *name, const std::string &value);
 
-/// Columns on a terminal that a text takes up, as far as its bytes tell: those that continue a
-/// character take up none.
-[[nodiscard]] std::size_t width_of(const std::string &text);
-
-/// Rows of equally many cells; the first has the headings.
+/// Rows of equally many cells; the first has the headings. table.h has tables with more to say.
 using TableRows = std::vector<std::vector<std::string>>;
 void print_table(std::ostream &out, const TableRows &rows);
 

@@ -1,6 +1,7 @@
 #include "host/ovctl/render_tunnels.h"
 
 #include "host/ovctl/render_parts.h"
+#include "host/ovctl/table.h"
 
 #include <nlohmann/json.hpp>
 
@@ -32,24 +33,14 @@ std::string alias_of(const json &tunnel)
     return text_of(tunnel, "alias") + (ambiguous ? " (ambiguous)" : "");
 }
 
-/// Two columns go before the last one.
-void print_row(std::ostream &out, std::size_t name_width, const std::string &name,
-               const std::string &id, const std::string &alias)
-{
-    constexpr std::size_t id_width = 5;
-    out << name << std::string(name_width - width_of(name), ' ') << "  "
-        << std::string(id_width - std::min(id_width, id.size()), ' ') << id << "  " << alias
-        << '\n';
-}
-
 void print_list(const json &tunnels, std::ostream &out)
 {
-    std::size_t width = width_of("NAME");
+    Table table({{.heading = "NAME"},
+                 {.heading = "ID", .right = true, .min_width = 5},
+                 {.heading = "ALIAS"}});
     for (const json &tunnel : tunnels)
-        width = std::max(width, width_of(text_of(tunnel, "name")));
-    print_row(out, width, "NAME", "ID", "ALIAS");
-    for (const json &tunnel : tunnels)
-        print_row(out, width, text_of(tunnel, "name"), id_of(tunnel), alias_of(tunnel));
+        table.add({text_of(tunnel, "name"), id_of(tunnel), alias_of(tunnel)});
+    table.print(out);
 }
 
 void print_table_fact(std::ostream &out, const char *name, const json &result, const char *member)

@@ -2,7 +2,10 @@
 
 #include "host/control/client.h"
 #include "host/control/message.h"
+#include "host/ovctl/follow.h"
+#include "host/ovctl/progress.h"
 #include "host/ovctl/render_error.h"
+#include "host/ovctl/terminal.h"
 #include "host/ovctl/text_input.h"
 #include "host/support/printable.h"
 
@@ -39,18 +42,44 @@ ExitCode report(const Failure &failure, const std::string &message, const Option
     if (options.json)
         render_error_json(RequestError(failure.code, message), out);
     else
-        err << "ovctl: " << message << '\n';
+        err << styled(err, Style::error, "ovctl:") << ' ' << message << '\n';
     return failure.exit;
 }
 
-ExitCode ask_and_print(const Invocation &invocation, std::ostream &out)
+/// The file that a command sends, by the name the user gave it; empty when it sends none.
+std::string file_of(const Invocation &invocation)
+{
+    const auto file = invocation.arguments.find("file");
+    if (file == invocation.arguments.end())
+        return {};
+    return file->second == "-" ? "standard input" : file->second;
+}
+
+json call_mgmtd(ControlClient &client, const Invocation &invocation, const json &arguments,
+                std::ostream &err)
+{
+    const char *const request = invocation.command->request;
+    const std::string file = file_of(invocation);
+    // Other requests are short.
+    if (file.empty())
+        return client.call(request, arguments);
+    ProgressLine line(err, file);
+    client.on_progress([&line](const CallProgress &progress) { line.update(progress); });
+    json result = client.call(request, arguments);
+    client.on_progress({});
+    return result;
+}
+
+ExitCode ask_and_print(const Invocation &invocation, std::ostream &out, std::ostream &err)
 {
     const Command &command = *invocation.command;
     const json arguments = command.build(invocation.arguments);
     const std::chrono::duration<double> patience(invocation.options.timeout_seconds);
     ControlClient client(invocation.options.socket,
                          std::chrono::ceil<std::chrono::milliseconds>(patience));
-    const json result = client.call(command.request, arguments);
+    const json result = call_mgmtd(client, invocation, arguments, err);
+    if (command.follows)
+        return follow_events(client, command, invocation.options.json, out);
     if (invocation.options.json)
         out << to_line({{"ok", true}, {"result", result}});
     else
@@ -76,7 +105,7 @@ ExitCode run_command(const Invocation &invocation, std::ostream &out, std::ostre
         return report(failure, message, options, out, err);
     };
     try {
-        return ask_and_print(invocation, out);
+        return ask_and_print(invocation, out, err);
     } catch (const RequestError &refusal) {
         if (options.json)
             render_error_json(refusal, out);
