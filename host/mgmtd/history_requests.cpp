@@ -98,7 +98,44 @@ std::vector<Change> changes_of(const Store &store, std::uint64_t number)
     return changes;
 }
 
+/// A remark is read by people, in one list with others, and is part of what every watcher gets.
+std::string comment_of(const json &request)
+{
+    constexpr std::size_t longest = 4096;
+    std::string comment = optional_text(request, "comment");
+    if (comment.size() > longest || comment.find('\0') != std::string::npos) {
+        throw RequestError(error_code::bad_value, "\"comment\" must have at most " +
+                                                      std::to_string(longest) +
+                                                      " bytes and no NUL character");
+    }
+    return comment;
+}
+
+/// Null when the changes are too many, or too long, to be sent to everybody who watches.
+json changes_for_watchers(const Store &store, const RecordedCommit &commit)
+{
+    constexpr std::uint64_t most = 1000;
+    constexpr std::size_t longest = 256UL << 10;
+    if (commit.changes > most) {
+        return {};
+    }
+    json changes = changes_json(changes_of(store, commit.number));
+    const auto replace = json::error_handler_t::replace;
+    return changes.dump(-1, ' ', false, replace).size() > longest ? json() : changes;
+}
+
 } // namespace
+
+std::optional<json> commit_event(const Store &store, std::uint64_t number)
+{
+    const std::optional<RecordedCommit> commit = store.recorded(number);
+    if (!commit) {
+        return std::nullopt;
+    }
+    return json{{"kind", "commit"},
+                {"commit", commit_json(*commit)},
+                {"changes", changes_for_watchers(store, *commit)}};
+}
 
 CommitNote client_note(const json &request, const ClientInfo &client)
 {
@@ -106,7 +143,7 @@ CommitNote client_note(const json &request, const ClientInfo &client)
     note.time = commit_time();
     note.uid = client.uid;
     note.author = client.user;
-    note.comment = optional_text(request, "comment");
+    note.comment = comment_of(request);
     note.confirm_within = optional_number(request, "confirm");
     if (note.confirm_within && (*note.confirm_within == 0 || *note.confirm_within > longest_wait)) {
         throw RequestError(error_code::bad_value, "\"confirm\" must be from 1 to " +

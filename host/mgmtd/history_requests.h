@@ -13,6 +13,7 @@ namespace ovhost
 {
 
 class Configuration;
+class Store;
 struct ClientInfo;
 
 /// These throw RequestError for a request that makes no sense, for a commit that is not known, and
@@ -35,6 +36,10 @@ struct ClientInfo;
 [[nodiscard]] nlohmann::json commit_answer(const Configuration &configuration,
                                            const CommitReport &report,
                                            const std::optional<Wait> &waited);
+
+/// What watchers are told of a stored commit; none when it is not in the history. The changes are
+/// null when there are more than watchers could be made to wait for. Throws StoreError.
+[[nodiscard]] std::optional<nlohmann::json> commit_event(const Store &store, std::uint64_t number);
 
 /// What waits for its confirmation, or null.
 [[nodiscard]] nlohmann::json wait_json(const Configuration &configuration);

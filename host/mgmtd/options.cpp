@@ -53,6 +53,9 @@ std::optional<DaemonOptions> parse_options(int argc, char **argv, int &ret_exit_
     app.add_option("--socket", options.socket, "Control socket")
         ->check(not_empty())
         ->capture_default_str();
+    app.add_option("--group", options.group,
+                   "Group whose members may use the control socket beside this user and root")
+        ->check(not_empty());
     app.add_option("--model", options.model,
                    "Model of the appliance: names its default file, defdb.conf.MODEL")
         ->check(CLI::Validator(model_fault, ""));

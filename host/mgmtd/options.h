@@ -13,6 +13,7 @@ namespace ovhost
 struct DaemonOptions {
     std::filesystem::path state_dir = "/var/lib/mgmtd";
     std::string socket = "/run/mgmtd/control.sock";
+    std::string group;          ///< empty: nobody but this user and root
     std::string model;          ///< empty: the configuration's own
     std::filesystem::path root; ///< empty: the machine's own paths
     int log_level = 5;
