@@ -1,6 +1,6 @@
 #include "host/commit/patch.h"
 
-#include <ranges>
+#include <algorithm>
 #include <string>
 #include <utility>
 #include <vector>
@@ -38,11 +38,11 @@ void clear_value(Tree &tree, const Parts &parts)
 Tree with_changes(Tree configuration, std::span<const Change> changes)
 {
     // Backwards, children go before their parents, so that a parent is seldom left with any.
-    for (const Change &change : changes | std::views::reverse) {
+    std::for_each(changes.rbegin(), changes.rend(), [&configuration](const Change &change) {
         if (!change.after) {
             clear_value(configuration, change.parts);
         }
-    }
+    });
     for (const Change &change : changes) {
         if (change.after) {
             configuration.set(change.parts, *change.after);
