@@ -7,6 +7,7 @@
 #include "host/framework/log_config.h"
 #include "host/framework/model_nodes.h"
 #include "host/framework/time_refresh.h"
+#include "host/mgmtd/rollback_target.h"
 #include "host/modules/default_values.h"
 #include "host/modules/node_access.h"
 #include "orvale/md_dyna_limits.h"
@@ -159,7 +160,7 @@ CommitReport Configuration::rollback(std::uint64_t number, CommitNote note)
         note.comment = "rollback to commit " + std::to_string(number);
     }
     Candidate past(running());
-    past.replace(after(number));
+    past.replace(rollback_target(after(number), running()));
     CommitReport report = confirmations_.commit(past, note);
     candidate_.rebase(running());
     return report;

@@ -3,6 +3,7 @@
 #include "framework/logging.h"
 #include "host/commit/past.h"
 #include "host/framework/log_config.h"
+#include "host/mgmtd/rollback_target.h"
 
 #include <algorithm>
 #include <exception>
@@ -153,7 +154,8 @@ CommitReport Confirmations::undo(const Wait &wait)
 {
     try {
         Candidate candidate(engine_.running());
-        candidate.replace(configuration_after(store_, engine_.running(), wait.back_to));
+        candidate.replace(rollback_target(
+            configuration_after(store_, engine_.running(), wait.back_to), engine_.running()));
         CommitNote note = daemon_note("undo of " + commits_text(wait) + ", not confirmed in time");
         note.rollback_to = wait.back_to;
         note.undoes_wait = true;
