@@ -5,6 +5,7 @@
 #include "libovmd/frame/built_path.h"
 #include "libovmd/md_tunneld_tunnel_common/unit.h"
 
+#include <cstdarg>
 #include <cstdio>
 
 using namespace ovmd;
@@ -17,6 +18,17 @@ constexpr char prefix_root[] = "/ov/tunneld/net/routes/config/ipv4/prefix";
 constexpr size_t nhop_list_size = 200;
 constexpr size_t node_size = 256;
 constexpr size_t escaped_size = 256;
+
+// snprintf whose cut is wanted: the compiler knows how long escaped names can be and would warn.
+template <size_t size>
+OV_PRINTF(2, 3)
+void print_cut(char (&buffer)[size], const char *format, ...)
+{
+    va_list arguments;
+    va_start(arguments, format);
+    (void)vsnprintf(buffer, size, format, arguments);
+    va_end(arguments);
+}
 
 size_t escaped_length(const char *text)
 {
@@ -82,7 +94,7 @@ int remove_next_hops(const route_removal &removal, const char *list_node, const 
             continue;
         }
         char node[node_size];
-        (void)snprintf(node, sizeof node, "%s/%s", list_node, nhop);
+        print_cut(node, "%s/%s", list_node, nhop);
         const int err = remove_node(removal, node, nhop);
         if (err != 0) {
             return err;
@@ -98,7 +110,7 @@ int remove_from_prefix(const route_removal &removal, const char *prefix, uint32 
 {
     const char *const escaped = add_escape_for_bname(prefix);
     char list_node[nhop_list_size];
-    (void)snprintf(list_node, sizeof list_node, "%s/%s/nhop", prefix_root, escaped);
+    print_cut(list_node, "%s/%s/nhop", prefix_root, escaped);
     owned_tstr_array nhops;
     BAIL_ERROR_FOR(removal.function,
                    mdb_get_tstr_array(removal.commit, removal.db, list_node, 0, 0, 0, nhops.out()));
@@ -106,7 +118,7 @@ int remove_from_prefix(const route_removal &removal, const char *prefix, uint32 
     int err = remove_next_hops(removal, list_node, nhops.get(), count);
     if (err == 0 && count > 0 && count >= length_of(nhops.get())) {
         char node[node_size];
-        (void)snprintf(node, sizeof node, "%s/%s", prefix_root, escaped);
+        print_cut(node, "%s/%s", prefix_root, escaped);
         err = remove_node(removal, node, escaped);
     }
     total += count;
