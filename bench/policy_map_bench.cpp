@@ -2,15 +2,13 @@
 // of maps of the older form. Each stands beside the host operations that the same work cannot do
 // without, called one after the other with all names at hand.
 
-#include "bench/goals.h"
+#include "bench/bare_work.h"
 #include "bench/policy_maps.h"
 #include "framework/addresses.h"
 #include "framework/logging.h"
-#include "host/tree/diff.h"
 #include "orvale/md_xmap_common.h"
 
 #include <array>
-#include <map>
 #include <memory>
 #include <string>
 #include <vector>
@@ -34,18 +32,6 @@ int list(md_commit *commit, const mdb_db &db, const std::string &node)
     const int status = mdb_get_tstr_array(commit, &db, node.c_str(), 0, 0, 0, names.out());
     benchmark::DoNotOptimize(names.get());
     return status;
-}
-
-/// The same data for all repetitions of a size.
-template <typename Data>
-Data &of_size(const benchmark::State &state)
-{
-    static std::map<int64_t, std::unique_ptr<Data>> made;
-    std::unique_ptr<Data> &data = made[state.range(0)];
-    if (data == nullptr) {
-        data = std::make_unique<Data>(static_cast<int>(state.range(0)));
-    }
-    return *data;
 }
 
 /// Entries that all match by one ACL, as they are before a commit.
@@ -346,48 +332,6 @@ struct LegacyMaps {
     std::vector<std::string> prio_nodes;
 };
 
-/// Work that leaves everything as it was.
-template <typename Data, int (Data::*work)()>
-void repeat(benchmark::State &state)
-{
-    Data &data = of_size<Data>(state);
-    for (auto _ : state) {
-        if ((data.*work)() != 0) {
-            state.SkipWithError("the work failed");
-        }
-    }
-}
-
-/// Work that begins on another database each time.
-template <typename Data, int (Data::*work)()>
-void repeat_anew(benchmark::State &state)
-{
-    Data &data = of_size<Data>(state);
-    for (auto _ : state) {
-        state.PauseTiming();
-        data.begin();
-        state.ResumeTiming();
-        if ((data.*work)() != 0) {
-            state.SkipWithError("the work failed");
-        }
-    }
-    data.begin();
-}
-
-/// Both roads lead to the same database.
-template <typename Data, int (Data::*work)(), int (Data::*queries)()>
-void require_same_end(int num_entries)
-{
-    Data data(num_entries);
-    const ovhost::Tree start = data.newdb.tree;
-    require((data.*work)() == 0, "the work failed");
-    const ovhost::Tree end = data.newdb.tree;
-    data.begin();
-    require((data.*queries)() == 0, "the queries failed");
-    require(!ovhost::diff(start, end).empty(), "nothing was done");
-    require(ovhost::diff(end, data.newdb.tree).empty(), "the queries do not do the same");
-}
-
 void require_same_ends()
 {
     for (const int num_entries : {10, 1'000}) {
@@ -395,21 +339,6 @@ void require_same_ends()
         require_same_end<LegacyMaps, &LegacyMaps::upgrade, &LegacyMaps::query>(num_entries);
     }
 }
-
-struct Size {
-    int num_entries;
-    const char *label;
-};
-
-constexpr Size sizes[] = {{10, "10"}, {1'000, "1,000"}, {10'000, "10,000"}};
-
-/// One kind of work: its benches are named by `name`, and "NAME_bare" is of the queries alone.
-struct Work {
-    const char *name;
-    const char *label;
-    void (*library)(benchmark::State &);
-    void (*bare)(benchmark::State &);
-};
 
 constexpr Work works[] = {
     {"check", "common change check of a new entry", repeat<EntryAddition, &EntryAddition::check>,
@@ -422,67 +351,6 @@ constexpr Work works[] = {
      repeat_anew<LegacyMaps, &LegacyMaps::query>},
 };
 
-std::string bench_name(const Work &work, const Size &size)
-{
-    return std::string(work.name) + '/' + std::to_string(size.num_entries);
-}
-
-std::string bare_name(const Work &work, const Size &size)
-{
-    return std::string(work.name) + "_bare/" + std::to_string(size.num_entries);
-}
-
-void add_bench(const std::string &name, void (*run)(benchmark::State &))
-{
-    auto *const bench = benchmark::RegisterBenchmark(name.c_str(), run);
-    for (const Size &size : sizes) {
-        bench->Arg(size.num_entries);
-    }
-    bench->Unit(benchmark::kMicrosecond)->MinTime(0.02)->Repetitions(9)->ReportAggregatesOnly();
-}
-
-/// The library's own share of the time is a quarter at most.
-ovbench::GoalTable beside_queries()
-{
-    constexpr double limit = 1 / 0.75;
-    GoalTable table{"Route maps, ten of them with the entries spread evenly: the library's "
-                    "operations, beside the host operations that the same work cannot do without, "
-                    "called one after the other with all names at hand. The library's own share "
-                    "of the time is to be a quarter at most.",
-                    "work, entries",
-                    "library",
-                    {"bare host queries"},
-                    {}};
-    for (const Work &work : works) {
-        for (const Size &size : sizes) {
-            table.rows.push_back({std::string(work.label) + ", " + size.label,
-                                  bench_name(work, size),
-                                  {{bare_name(work, size), limit}}});
-        }
-    }
-    return table;
-}
-
-/// Linear: ten times the entries take ten times as long, and half as much again for memory that is
-/// farther away.
-ovbench::GoalTable growth()
-{
-    constexpr double limit = 10 * 1.5;
-    const Size &less = sizes[1];
-    const Size &more = sizes[2];
-    GoalTable table{"How the same grows from 1,000 entries to ten times as many. At most 15 times "
-                    "as long: linear, with half as much again for memory that is farther away.",
-                    "work",
-                    "10,000 entries",
-                    {"1,000 entries"},
-                    {}};
-    for (const Work &work : works) {
-        table.rows.push_back(
-            {work.label, bench_name(work, more), {{bench_name(work, less), limit}}});
-    }
-    return table;
-}
-
 } // namespace
 
 int main(int argc, char **argv)
@@ -490,11 +358,8 @@ int main(int argc, char **argv)
     G_daemon_log_level = ov_log_error;
     allow_many_entries();
     require_same_ends();
-    GoalReport report{"Policy maps", {beside_queries(), growth()}};
-    for (const Work &work : works) {
-        add_bench(work.name, work.library);
-        add_bench(std::string(work.name) + "_bare", work.bare);
-        report.groups.push_back('^' + std::string(work.name));
-    }
-    return run_with_goals(argc, argv, report);
+    return run_beside_bare(
+        argc, argv,
+        {"Policy maps", "Route maps, ten of them with the entries spread evenly", "entries"},
+        works);
 }

@@ -1,13 +1,9 @@
 #pragma once
-// Route maps of many entries, and the owners of what the host hands out about them.
+// Route maps of many entries, and commits that change them.
 
-#include "framework/bnode.h"
+#include "bench/owned.h"
 #include "framework/md_commit.h"
-#include "framework/tstr_array.h"
-#include "framework/tstring.h"
-#include "host/framework/objects.h"
 
-#include <cstdlib>
 #include <string>
 #include <vector>
 
@@ -16,37 +12,6 @@ namespace ovbench
 
 inline constexpr int num_maps = 10; ///< as many as an appliance takes
 inline constexpr char route_root[] = "/ov/tunneld/route_map/config/map";
-
-template <typename T, void (*Free)(T **)>
-class Owned
-{
-  public:
-    Owned() = default;
-    Owned(const Owned &) = delete;
-    Owned &operator=(const Owned &) = delete;
-    ~Owned() { Free(&object_); }
-
-    T *get() const { return object_; }
-    T **out() { return &object_; }
-
-  private:
-    T *object_ = nullptr;
-};
-
-inline void free_text(char **text)
-{
-    std::free(*text);
-}
-
-using OwnedText = Owned<char, free_text>;
-using OwnedString = Owned<tstring, ts_free>;
-using OwnedStrings = Owned<tstr_array, tstr_array_free>;
-using OwnedBinding = Owned<bn_binding, bn_binding_free>;
-
-void require(bool holds, const char *what);
-
-/// Sets a node.
-void set(mdb_db &db, const std::string &node, bn_type type, const std::string &value);
 
 /// The first map's name and priorities are entry 0, then come the other maps'.
 struct EntryName {
