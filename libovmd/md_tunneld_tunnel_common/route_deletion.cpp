@@ -5,7 +5,6 @@
 #include "libovmd/frame/built_path.h"
 #include "libovmd/md_tunneld_tunnel_common/unit.h"
 
-#include <cstdarg>
 #include <cstdio>
 
 using namespace ovmd;
@@ -19,17 +18,6 @@ constexpr size_t nhop_list_size = 200;
 constexpr size_t node_size = 256;
 constexpr size_t escaped_size = 256;
 
-// snprintf whose cut is wanted: the compiler knows how long escaped names can be and would warn.
-template <size_t size>
-OV_PRINTF(2, 3)
-void print_cut(char (&buffer)[size], const char *format, ...)
-{
-    va_list arguments;
-    va_start(arguments, format);
-    (void)vsnprintf(buffer, size, format, arguments);
-    va_end(arguments);
-}
-
 size_t escaped_length(const char *text)
 {
     size_t length = 0;
@@ -41,8 +29,10 @@ size_t escaped_length(const char *text)
 
 // Makes one component of a node's name of a text that has slashes in it. The result has no
 // terminating NUL of its own, and the next call overwrites it: routes are found in the order and by
-// the names that this has always led to. The text must be fit to be escaped.
-const char *add_escape_for_bname(const char *str)
+// the names that this has always led to. The text must be fit to be escaped. Not inlined, because a
+// compiler that sees how long the result can be warns of the node names that it makes too long:
+// they are to be cut.
+[[gnu::noinline]] const char *add_escape_for_bname(const char *str)
 {
     static char bname_esc[escaped_size];
     char *end = bname_esc;
@@ -94,7 +84,7 @@ int remove_next_hops(const route_removal &removal, const char *list_node, const 
             continue;
         }
         char node[node_size];
-        print_cut(node, "%s/%s", list_node, nhop);
+        (void)snprintf(node, sizeof node, "%s/%s", list_node, nhop);
         const int err = remove_node(removal, node, nhop);
         if (err != 0) {
             return err;
@@ -110,7 +100,7 @@ int remove_from_prefix(const route_removal &removal, const char *prefix, uint32 
 {
     const char *const escaped = add_escape_for_bname(prefix);
     char list_node[nhop_list_size];
-    print_cut(list_node, "%s/%s/nhop", prefix_root, escaped);
+    (void)snprintf(list_node, sizeof list_node, "%s/%s/nhop", prefix_root, escaped);
     owned_tstr_array nhops;
     BAIL_ERROR_FOR(removal.function,
                    mdb_get_tstr_array(removal.commit, removal.db, list_node, 0, 0, 0, nhops.out()));
@@ -118,7 +108,7 @@ int remove_from_prefix(const route_removal &removal, const char *prefix, uint32 
     int err = remove_next_hops(removal, list_node, nhops.get(), count);
     if (err == 0 && count > 0 && count >= length_of(nhops.get())) {
         char node[node_size];
-        print_cut(node, "%s/%s", prefix_root, escaped);
+        (void)snprintf(node, sizeof node, "%s/%s", prefix_root, escaped);
         err = remove_node(removal, node, escaped);
     }
     total += count;
