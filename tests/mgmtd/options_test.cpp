@@ -46,18 +46,20 @@ TEST(Options, HaveDefaults)
     EXPECT_EQ(parsed.options->log_level, 5);
     EXPECT_EQ(parsed.options->module_log_level, 6);
     EXPECT_EQ(parsed.options->peer_buffer_mib, 64U);
+    EXPECT_EQ(parsed.options->group, "");
 }
 
 TEST(Options, TakeEachValue)
 {
     const Parsed parsed =
         parse({"--state-dir", "/s", "--socket", "/c", "--model", "m", "--root", "/r", "--log-level",
-               "debug", "--module-log-level", "3", "--peer-buffer", "8"});
+               "debug", "--group", "g", "--module-log-level", "3", "--peer-buffer", "8"});
     ASSERT_TRUE(parsed.options);
     EXPECT_EQ(parsed.options->state_dir, "/s");
     EXPECT_EQ(parsed.options->socket, "/c");
     EXPECT_EQ(parsed.options->model, "m");
     EXPECT_EQ(parsed.options->root, "/r");
+    EXPECT_EQ(parsed.options->group, "g");
     EXPECT_EQ(parsed.options->log_level, 7);
     EXPECT_EQ(parsed.options->module_log_level, 3);
     EXPECT_EQ(parsed.options->peer_buffer_mib, 8U);
