@@ -11,6 +11,9 @@
 #include <unistd.h>
 
 #include <cerrno>
+#include <map>
+#include <optional>
+#include <vector>
 
 #include "host/store/store.h"
 #include "tests/store/child.h"
@@ -130,13 +133,18 @@ namespace
 struct Content {
     std::uint64_t number = 0;
     Nodes nodes;
+    std::map<std::uint64_t, std::vector<ovhost::RecordedChange>> history;
+    std::optional<ovhost::Wait> wait;
 
     bool operator==(const Content &) const = default;
 };
 
 Content content_of(const Store &store)
 {
-    return {store.commit_number(), nodes_of(store)};
+    Content content{store.commit_number(), nodes_of(store), {}, store.wait()};
+    for (const ovhost::RecordedCommit &commit : store.history(100))
+        content.history[commit.number] = store.changes_of(commit.number);
+    return content;
 }
 
 // What a crash now would leave.
@@ -166,7 +174,9 @@ class StoreFault : public testing::TestWithParam<bool>
         try {
             auto changes = numbered(200, "after");
             changes.push_back(gone("/kept"));
-            store.commit(changes);
+            ovhost::CommitNote note;
+            note.confirm_within = 60;
+            store.commit(changes, note);
             return true;
         } catch (const StoreError &) {
             return false;
@@ -207,6 +217,42 @@ TEST_P(StoreFault, ACommitIsStoredWholeOrNotAtAll)
         EXPECT_EQ(content_of(Store::open(scratch.path())), expected);
     }
     EXPECT_GT(refusals, 2);
+}
+
+TEST_P(StoreFault, AConfirmationIsStoredOrTheWaitGoesOn)
+{
+    const bool lasting = GetParam();
+    int refusals = 0;
+    for (int n = 1;; ++n) {
+        SCOPED_TRACE(n);
+        const ScratchDir scratch;
+        Store store = Store::open(scratch.path());
+        ovhost::CommitNote note;
+        note.confirm_within = 60;
+        store.commit(std::vector{put("/a", "1")}, note);
+        const Content before = content_of(store);
+        bool acknowledged = true;
+        {
+            const FaultsFrom active(n, lasting);
+            try {
+                store.confirm();
+            } catch (const StoreError &error) {
+                EXPECT_THAT(error.what(), testing::StartsWith("cannot store the confirmation in "));
+                acknowledged = false;
+                ++refusals;
+            }
+        }
+        EXPECT_EQ(store.wait().has_value(), !acknowledged);
+        if (!acknowledged) {
+            EXPECT_EQ(content_of(store), before);
+        }
+        if (acknowledged || !lasting) {
+            EXPECT_EQ(content_after_crash(scratch.path()), content_of(store));
+        }
+        if (faults.hits == 0)
+            break;
+    }
+    EXPECT_GT(refusals, 0);
 }
 
 TEST_P(StoreFault, NoCommitIsAcknowledgedBeforeItIsOnTheDisk)
