@@ -20,9 +20,12 @@ function(ovmd_host_library target)
   target_link_libraries(${target} PRIVATE ovmd_build_flags)
 endfunction()
 
-# Reads the headers that every test needs once for each program: they are most of a test's build.
-# Sources still include what they use; CMAKE_DISABLE_PRECOMPILE_HEADERS=ON shows one that does not.
-function(ovmd_precompile_test_headers target)
+# Adds the target whose headers every test program takes over, read once for all of them: they are
+# most of a test's build. Sources still include what they use; CMAKE_DISABLE_PRECOMPILE_HEADERS=ON
+# shows one that does not.
+function(ovmd_test_headers target source)
+  add_library(${target} OBJECT ${source})
+  target_link_libraries(${target} PRIVATE ovmd_build_flags GTest::gmock)
   target_precompile_headers(${target} PRIVATE
     <gmock/gmock.h> <gtest/gtest.h> <algorithm> <filesystem> <map> <string> <vector>)
 endfunction()
@@ -34,6 +37,6 @@ function(ovmd_test target)
   add_executable(${target} ${arg_SOURCES})
   target_include_directories(${target} PRIVATE ${PROJECT_SOURCE_DIR} ${PROJECT_SOURCE_DIR}/include)
   target_link_libraries(${target} PRIVATE ovmd_build_flags ${arg_LIBS} GTest::gmock_main)
-  ovmd_precompile_test_headers(${target})
+  target_precompile_headers(${target} REUSE_FROM ovtest_headers)
   gtest_discover_tests(${target} DISCOVERY_MODE PRE_TEST PROPERTIES TIMEOUT 300)
 endfunction()

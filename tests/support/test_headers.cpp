@@ -1,0 +1,1 @@
+// No code of its own: what is compiled here once are the headers that every test takes over.
