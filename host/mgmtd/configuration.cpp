@@ -65,11 +65,17 @@ Configuration::Configuration(const std::filesystem::path &state_dir, const Histo
 {
     // Order counts: checks refuse before anything follows, and events tell of what is done.
     engine_.add_module(schema_);
+    engine_.add_module(name_depth_);
     engine_.add_module(model_);
     engine_.add_module(tunnels_);
     // Maps look for the ACLs that they name.
     engine_.add_module(acls_);
     engine_.add_module(applications_);
+    engine_.add_module(interfaces_);
+    engine_.add_module(interface_users_);
+    engine_.add_module(routes_);
+    engine_.add_module(addresses_);
+    engine_.add_module(interface_budget_);
     engine_.add_module(vlans_);
     engine_.add_module(labels_);
     engine_.add_module(preferred_interfaces_);

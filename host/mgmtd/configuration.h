@@ -10,10 +10,16 @@
 #include "host/modules/applications.h"
 #include "host/modules/change_events.h"
 #include "host/modules/dns_proxy_maps.h"
+#include "host/modules/interface_addresses.h"
+#include "host/modules/interface_budget.h"
+#include "host/modules/interface_users.h"
 #include "host/modules/interfaces.h"
 #include "host/modules/limits.h"
 #include "host/modules/maps.h"
 #include "host/modules/model.h"
+#include "host/modules/name_depth.h"
+#include "host/modules/net_interfaces.h"
+#include "host/modules/routes.h"
 #include "host/modules/schema.h"
 #include "host/modules/tunnels.h"
 #include "host/store/store.h"
@@ -86,10 +92,16 @@ class Configuration
     Store store_;
     StoreAdapter adapter_;
     SchemaModule schema_;
+    NameDepthModule name_depth_;
     ModelModule model_;
     TunnelsModule tunnels_;
     AclsModule acls_;
     ApplicationsModule applications_;
+    NetInterfacesModule interfaces_;
+    InterfaceUsersModule interface_users_;
+    RoutesModule routes_;
+    InterfaceAddressesModule addresses_;
+    InterfaceBudgetModule interface_budget_;
     VlansModule vlans_;
     InterfaceLabelsModule labels_;
     PreferredInterfacesModule preferred_interfaces_;

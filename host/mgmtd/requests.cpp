@@ -8,6 +8,7 @@
 #include "host/framework/time_refresh.h"
 #include "host/mgmtd/answers.h"
 #include "host/mgmtd/history_requests.h"
+#include "host/mgmtd/library_requests.h"
 #include "host/mgmtd/show.h"
 #include "host/modules/legacy_upgrade.h"
 #include "host/modules/node_access.h"
@@ -85,6 +86,8 @@ const Requests::Command Requests::commands[] = {
     {"status", &Requests::status},     {"show", &Requests::show},
     {"upgrade", &Requests::upgrade},   {"history", &Requests::history},
     {"rollback", &Requests::rollback}, {"confirm", &Requests::confirm},
+    {"enable", &Requests::enable},     {"clear", &Requests::clear},
+    {"alarm", &Requests::alarm},
 };
 
 Requests::Requests(Configuration &configuration, DaemonView daemon)
@@ -237,6 +240,21 @@ json Requests::confirm(const json &, const ClientInfo &)
     return answer;
 }
 
+json Requests::enable(const json &request, const ClientInfo &)
+{
+    return answer_enable(configuration_, request);
+}
+
+json Requests::clear(const json &request, const ClientInfo &)
+{
+    return answer_clear(configuration_, request);
+}
+
+json Requests::alarm(const json &request, const ClientInfo &)
+{
+    return answer_alarm(request);
+}
+
 json Requests::upgrade(const json &request, const ClientInfo &client)
 {
     const std::string text = required_text(request, "text");
@@ -256,6 +274,11 @@ json Requests::upgrade(const json &request, const ClientInfo &client)
     if (!result.entry_faults.empty()) {
         throw RequestError(error_code::refused, "entries cannot be upgraded; nothing was stored",
                            details_of(result.entry_faults));
+    }
+    if (result.converted + result.by_acl == 0) {
+        throw RequestError(error_code::refused,
+                           source + " has no map entries to convert; nothing was stored (use load "
+                                    "for a file of other nodes)");
     }
     CommitNote note = client_note(request, client);
     if (note.comment.empty()) {

@@ -1,7 +1,7 @@
 #pragma once
 // What clients can ask of the daemon: one handler for each command of docs/control-protocol.md.
-// control/server.h brings the requests; configuration.h is what they are about. history_requests.h
-// and show.h have the answers of their own fields.
+// control/server.h brings the requests; configuration.h is what they are about. history_requests.h,
+// library_requests.h and show.h have the answers of their own fields.
 
 #include "host/control/request_handler.h"
 #include "host/mgmtd/configuration.h"
@@ -52,6 +52,9 @@ class Requests : public RequestHandler
     nlohmann::json history(const nlohmann::json &request, const ClientInfo &client);
     nlohmann::json rollback(const nlohmann::json &request, const ClientInfo &client);
     nlohmann::json confirm(const nlohmann::json &request, const ClientInfo &client);
+    nlohmann::json enable(const nlohmann::json &request, const ClientInfo &client);
+    nlohmann::json clear(const nlohmann::json &request, const ClientInfo &client);
+    nlohmann::json alarm(const nlohmann::json &request, const ClientInfo &client);
 
     CommitReport store_candidate(const CommitNote &note, const char *refusal);
 

@@ -5,6 +5,7 @@
 #include "host/control/request_error.h"
 #include "host/mgmtd/configuration.h"
 #include "host/mgmtd/history_requests.h"
+#include "host/mgmtd/show_interfaces.h"
 #include "host/mgmtd/show_maps.h"
 #include "host/modules/mode.h"
 #include "host/modules/tunnel_lookup.h"
@@ -136,6 +137,8 @@ constexpr Subject subjects[] = {
     {"maps", show_maps},
     {"acl", show_acl},
     {"references", show_references},
+    {"interfaces", show_interfaces},
+    {"budget", show_budget},
     {"commit", answer_show_commit},
 };
 

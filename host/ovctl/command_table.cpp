@@ -2,6 +2,7 @@
 
 #include "host/ovctl/render.h"
 #include "host/ovctl/render_history.h"
+#include "host/ovctl/render_interfaces.h"
 #include "host/ovctl/render_maps.h"
 #include "host/ovctl/render_tunnels.h"
 #include "host/ovctl/text_input.h"
@@ -34,6 +35,18 @@ constexpr ArgumentSpec set_arguments[] = {
 
 constexpr ArgumentSpec delete_arguments[] = {
     {positional, "name", "The node's full name"},
+};
+
+constexpr ArgumentSpec clear_arguments[] = {
+    {positional, "name", "The full name of the node that stays"},
+};
+
+constexpr ArgumentSpec enable_arguments[] = {
+    {positional, "name", "The interface's name"},
+};
+
+constexpr ArgumentSpec alarm_arguments[] = {
+    {positional, "text", "The alarm, one line"},
 };
 
 constexpr ArgumentSpec load_arguments[] = {
@@ -110,6 +123,21 @@ json delete_request(const Arguments &arguments)
     return {{"name", checked_utf8(arguments.at("name"), "NAME")}};
 }
 
+json enable_request(const Arguments &arguments)
+{
+    return {{"name", checked_utf8(arguments.at("name"), "NAME")}, {"enabled", true}};
+}
+
+json disable_request(const Arguments &arguments)
+{
+    return {{"name", checked_utf8(arguments.at("name"), "NAME")}, {"enabled", false}};
+}
+
+json alarm_request(const Arguments &arguments)
+{
+    return {{"text", checked_utf8(arguments.at("text"), "the alarm")}};
+}
+
 json load_request(const Arguments &arguments)
 {
     const std::string &file = arguments.at("file");
@@ -183,6 +211,16 @@ json show_tunnel_request(const Arguments &arguments)
     return {{"what", "tunnel"}, {key, checked_utf8(value, "the " + key)}};
 }
 
+json show_interfaces_request(const Arguments &)
+{
+    return {{"what", "interfaces"}};
+}
+
+json show_budget_request(const Arguments &)
+{
+    return {{"what", "budget"}};
+}
+
 json show_maps_request(const Arguments &)
 {
     return {{"what", "maps"}};
@@ -206,6 +244,13 @@ constexpr Command table[] = {
     {"delete", "Remove a node and everything below it from the candidate",
      "ovctl delete /ov/tunneld/system/config/mode", delete_arguments, "delete", delete_request,
      render_nothing, "the change"},
+    {"clear", "Remove everything below a node from the candidate, and keep the node",
+     "ovctl clear /ov/iflabels/config/lan", clear_arguments, "clear", delete_request, render_clear,
+     "the change"},
+    {"enable", "Set an interface's enable flag in the candidate", "ovctl enable eth0",
+     enable_arguments, "enable", enable_request, render_nothing, "the change"},
+    {"disable", "Take back an interface's enable flag in the candidate", "ovctl disable eth0",
+     enable_arguments, "enable", disable_request, render_nothing, "the change"},
     {"load", "Apply the lines of a file to the candidate, all or none",
      "ovctl load site.db && ovctl commit", load_arguments, "load", load_request, render_load,
      "the file"},
@@ -258,6 +303,9 @@ constexpr Command table[] = {
      "the query",
      nullptr,
      true},
+    {"alarm", "Append a line to the alarms of software upgrades",
+     "ovctl alarm \"restart the appliance\"", alarm_arguments, "alarm", alarm_request,
+     render_nothing, "the alarm"},
     {"status",
      "Print facts about the daemon",
      "ovctl status",
@@ -294,6 +342,22 @@ constexpr Command table[] = {
      "show",
      show_tunnel_tables_request,
      render_tunnel_tables,
+     "the query"},
+    {"show interfaces",
+     "List all interfaces with who uses them",
+     "ovctl show interfaces",
+     {},
+     "show",
+     show_interfaces_request,
+     render_interfaces,
+     "the query"},
+    {"show budget",
+     "Print how many VLAN and tunnel interfaces there are, and how many more fit",
+     "ovctl show budget",
+     {},
+     "show",
+     show_budget_request,
+     render_budget,
      "the query"},
     {"show maps",
      "List the entries of all maps with what they match",

@@ -161,7 +161,8 @@ TEST_F(Client, ShowsTheMode)
                                             "router interfaces   0\n"
                                             "10 gigabit          no\n"
                                             "bonding             no\n"));
-    ASSERT_EQ(ovctl({"load", "-"}, "/ov/tunneld/system/config/mode,string,router\n"
+    ASSERT_EQ(ovctl({"load", "-"}, "/net/interface/config/eth0,string,eth0\n"
+                                   "/ov/tunneld/system/config/mode,string,router\n"
                                    "/ov/tunneld/system/config/mode/router/1/ifname,string,eth0\n"
                                    "/ov/tunneld/system/config/routing_inline,bool,true\n"
                                    "/ov/tunneld/system/config/10g,bool,true\n"

@@ -19,6 +19,10 @@ using testing::Not;
 namespace fs = std::filesystem;
 
 constexpr const char *sample_configuration =
+    "/net/interface/config/eth0 string eth0\n"
+    "/net/interface/config/eth0/enable bool true\n"
+    "/net/interface/config/eth1 string eth1\n"
+    "/net/interface/config/eth1/enable bool true\n"
     "/ov/model/config/name string branch-100\n"
     "/ov/model/limits/max_dns_proxy_map_entries uint32 20\n"
     "/ov/model/limits/max_interfaces uint32 16\n"
@@ -76,10 +80,10 @@ TEST_F(FirstStart, BuildsTheConfigurationFromTheSampleFiles)
     EXPECT_EQ(read_file(limits_file()), sample_limits);
     const auto lines = log_lines(log());
     EXPECT_THAT(lines, Contains("notice mgmtd -: compiled-in defaults: 11 set, 0 removed"));
-    EXPECT_THAT(lines, Contains("notice mgmtd -: model defaults: 19 set, 1 removed"));
+    EXPECT_THAT(lines, Contains("notice mgmtd -: model defaults: 23 set, 1 removed"));
     EXPECT_THAT(lines, Contains("notice mgmtd -: debugging defaults: 2 set, 0 removed"));
     EXPECT_THAT(lines, Contains("notice mgmtd -: preserved values: 2 set, 1 removed"));
-    EXPECT_THAT(lines, Contains("notice mgmtd -: first configuration stored: 21 nodes"));
+    EXPECT_THAT(lines, Contains("notice mgmtd -: first configuration stored: 25 nodes"));
     EXPECT_FALSE(exists(root_ + "/var/opt/tms/.preserved_db"));
     EXPECT_TRUE(exists(root_ + "/var/opt/tms/.preserved_db.read"));
 }

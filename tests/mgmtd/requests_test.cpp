@@ -302,7 +302,9 @@ TEST_F(RequestsTest, ShowModeAnswersForTheRunningConfiguration)
         R"("router_interfaces":0,"server":false,"submode":"normal","ten_gigabit":false})";
     EXPECT_EQ(ask(R"({"command":"show","what":"mode"})"), bridge);
     EXPECT_EQ(ask(json{{"command", "load"},
-                       {"text", "/ov/tunneld/system/config/mode,string,router\n"
+                       {"text", "/net/interface/config/eth0,string,eth0\n"
+                                "/net/interface/config/eth1,string,eth1\n"
+                                "/ov/tunneld/system/config/mode,string,router\n"
                                 "/ov/tunneld/system/config/mode/router/1/ifname,string,eth0\n"
                                 "/ov/tunneld/system/config/mode/router/2/ifname,string,eth1\n"
                                 "/ov/tunneld/system/config/submode,string,special\n"
@@ -310,7 +312,7 @@ TEST_F(RequestsTest, ShowModeAnswersForTheRunningConfiguration)
                                 "/ov/tunneld/system/config/10g,bool,true\n"
                                 "/ov/tunneld/system/config/bonding,bool,true\n"}}
                       .dump()),
-              R"({"removed":0,"set":7})");
+              R"({"removed":0,"set":9})");
     EXPECT_EQ(ask(R"({"command":"show","what":"mode"})"), bridge) << "nothing is committed yet";
     (void)ask(R"({"command":"commit"})");
     EXPECT_EQ(
