@@ -3,7 +3,6 @@
 #include "framework/appliance.h"
 #include "host/framework/c_boundary.h"
 #include "host/framework/objects.h"
-#include "host/tree/name.h"
 #include "host/tree/value_type.h"
 #include "orvale/md_xmap_common.h"
 #include "orvale/opkt_proto.h"
@@ -50,11 +49,12 @@ bool is_port_or_range(std::string_view value)
     return first && last && *first <= *last;
 }
 
-/// What the library looks a label up with, and nothing else: no wildcard, no further component.
+/// One component of a pattern that stands for itself alone. Neither labels nor VLANs have slashes
+/// or backslashes in their names, so that there is nothing to escape.
 bool is_label(std::string_view value)
 {
-    const auto pattern = NamePattern::parse("/" + std::string(value));
-    return pattern && pattern->parts().size() == 1 && pattern->parts().front().has_value();
+    return !value.empty() && value.size() <= longest_label && value != "*" &&
+           value.find_first_of("/\\") == std::string_view::npos;
 }
 
 bool is_protocol(std::string_view value)
@@ -84,8 +84,9 @@ constexpr std::size_t longest_match_string = MD_XMAP_MATCHSTR_SIZE - 1;
 
 constexpr std::string_view any_text = "a text that is not empty";
 constexpr std::string_view a_prefix = "an address and a mask length, such as 10.1.0.0/16";
+static_assert(longest_label == 233);
 constexpr std::string_view a_label =
-    "a label or a VLAN's name, which is not *, with any slash in it written as \\/";
+    "a label or a VLAN's name: 1 to 233 bytes without slash and backslash, and not * alone";
 constexpr std::string_view a_port = "a port from 0 to 65535 or a range such as 8000-8080";
 
 constexpr std::array<MatchKey, 10> match_keys = {{
@@ -138,7 +139,7 @@ std::optional<std::string> add_pair(std::string_view pair, MatchString &match)
     const std::string_view value = pair.substr(colon + 1);
     const MatchKey *key = find_key(name);
     if (key == nullptr) {
-        return "the key is not one of " + known_keys();
+        return std::string("the key is not one of ").append(known_keys());
     }
     const auto is_present = [name](const std::string &present) {
         return equal_ignoring_case(present, name);
@@ -147,7 +148,7 @@ std::optional<std::string> add_pair(std::string_view pair, MatchString &match)
         return "the key stands in an earlier pair already";
     }
     if (!key->accepts(value)) {
-        return "the value must be " + std::string(key->expected);
+        return std::string("the value must be ").append(key->expected);
     }
     match.keys.emplace_back(name);
     match.values.emplace_back(value);
@@ -162,7 +163,9 @@ std::optional<std::string> parse_match_string(std::string_view text, MatchString
         return "it is empty; write key:value pairs joined by commas, or any";
     }
     if (text.size() > longest_match_string) {
-        return "it is longer than " + std::to_string(longest_match_string) + " characters";
+        return std::string("it is longer than ")
+            .append(std::to_string(longest_match_string))
+            .append(" characters");
     }
     MatchString parsed;
     if (text != "any") {
@@ -170,7 +173,7 @@ std::optional<std::string> parse_match_string(std::string_view text, MatchString
             const std::size_t end = std::min(text.find(',', begin), text.size());
             const std::string_view pair = text.substr(begin, end - begin);
             if (const auto fault = add_pair(pair, parsed)) {
-                return "pair \"" + std::string(pair) + "\": " + *fault;
+                return std::string("pair \"").append(pair).append("\": ").append(*fault);
             }
             begin = end + 1;
         }

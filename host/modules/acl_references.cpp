@@ -1,6 +1,7 @@
 #include "host/modules/acl_references.h"
 
 #include "host/modules/acl_nodes.h"
+#include "host/modules/commit_access.h"
 #include "host/modules/node_access.h"
 #include "host/tree/name.h"
 
@@ -15,18 +16,36 @@ std::string kind_node(const std::string &acl, const MapKind &kind)
     return acl_node(acl) + "/" + kind.key;
 }
 
+std::string level_of_map(const std::string &acl, const MapEntry &entry)
+{
+    return kind_node(acl, *entry.kind) + "/" + escape_component(entry.map);
+}
+
+/// What mends a record that nothing stands behind.
+std::string delete_record(const std::string &acl, const MapEntry &entry)
+{
+    return "; delete " + reference_node(acl, entry);
+}
+
+/// What mends a record that is missing, or is not what it should be: the ACL named once more.
+std::string name_again(const MapEntry &entry)
+{
+    return "; delete " + match_node(*entry.kind, entry.map, entry.priority, "acl") +
+           ", commit, and set it again";
+}
+
 /// A record that does not fit the maps.
 void check_record(const mdb_db *db, const std::string &acl, const MapEntry &entry,
                   std::vector<ReferenceFault> &faults)
 {
     const std::string named = acl_of(db, entry);
     if (named != acl) {
-        faults.push_back({acl, entry,
-                          named.empty()
-                              ? "there is a record, but the entry names no ACL"
-                              : "there is a record, but the entry names ACL \"" + named + "\""});
+        const std::string fault = named.empty() ? "no ACL" : "ACL \"" + named + "\"";
+        faults.push_back(
+            {acl, entry,
+             "there is a record, but the entry names " + fault + delete_record(acl, entry)});
     } else if (node_text(db, reference_node(acl, entry)) != entry.priority) {
-        faults.push_back({acl, entry, "the record does not hold the priority"});
+        faults.push_back({acl, entry, "the record does not hold the priority" + name_again(entry)});
     }
 }
 
@@ -37,9 +56,9 @@ void check_entry(const mdb_db *db, const MapEntry &entry, std::vector<ReferenceF
     if (acl.empty() || node_binding(db, reference_node(acl, entry).c_str()) != nullptr) {
         return;
     }
-    faults.push_back({acl, entry,
-                      has_acl(db, acl) ? "the entry names the ACL, but there is no record"
-                                       : "the entry names the ACL, but there is no such ACL"});
+    const std::string missing = has_acl(db, acl) ? "record" : "such ACL";
+    faults.push_back(
+        {acl, entry, "the entry names the ACL, but there is no " + missing + name_again(entry)});
 }
 
 void check_maps(const mdb_db *db, const MapKind &kind, std::vector<ReferenceFault> &faults)
@@ -68,8 +87,7 @@ std::string acl_of(const mdb_db *db, const MapEntry &entry)
 
 std::string reference_node(const std::string &acl, const MapEntry &entry)
 {
-    return kind_node(acl, *entry.kind) + "/" + escape_component(entry.map) + "/prio/" +
-           escape_component(entry.priority);
+    return level_of_map(acl, entry) + "/prio/" + escape_component(entry.priority);
 }
 
 std::vector<MapEntry> recorded_references(const mdb_db *db, const std::string &acl)
@@ -85,6 +103,17 @@ std::vector<MapEntry> recorded_references(const mdb_db *db, const std::string &a
         }
     }
     return entries;
+}
+
+void forget_reference(const md_dbinfo *dbinfo, const std::string &acl, const MapEntry &entry)
+{
+    const std::string record = reference_node(acl, entry);
+    if (node_binding(dbinfo->newdb, record.c_str()) == nullptr) {
+        return;
+    }
+    const std::string map = level_of_map(acl, entry);
+    const bool is_last = child_names(dbinfo->newdb, map + "/prio").size() < 2;
+    propose_removal(dbinfo, is_last ? map : record);
 }
 
 ReferenceCheck check_references(const mdb_db *db)

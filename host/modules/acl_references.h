@@ -1,11 +1,13 @@
 #pragma once
 // References from ACLs to the map entries that name them. The library keeps a record for each
-// (md_acl_ref_processing); here they are read, and compared with what the maps say.
+// (md_acl_ref_processing), but not when an entry loses the node that names its ACL and nothing
+// else; that is done here. Here they are read, too, and compared with what the maps say.
 //
 // acl_nodes.h has the nodes, acls.h the module that keeps users from writing records.
 
 #include "host/modules/map_kinds.h"
 
+#include "framework/md_commit.h"
 #include "framework/mdb_db.h"
 
 #include <string>
@@ -36,11 +38,15 @@ struct MapEntry {
 /// The entries of which an ACL has records, whether they still name it or not.
 [[nodiscard]] std::vector<MapEntry> recorded_references(const mdb_db *db, const std::string &acl);
 
+/// Takes the record of an entry, if there is one, out of the database that a commit proposes; the
+/// last one of a map takes the map's level with it, as the library has it.
+void forget_reference(const md_dbinfo *dbinfo, const std::string &acl, const MapEntry &entry);
+
 /// Where records and maps do not agree.
 struct ReferenceFault {
     std::string acl;
     MapEntry entry;
-    std::string message;
+    std::string message; ///< what is wrong, and what to do about it
 };
 
 struct ReferenceCheck {

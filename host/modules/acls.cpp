@@ -24,9 +24,6 @@ constexpr std::size_t number_part = acl_name_part + 2;
 constexpr std::size_t field_part = acl_name_part + 3;
 constexpr std::size_t reference_size = acl_name_part + 5;
 
-/// An ACL's fields, and what lies below references, though it should not.
-constexpr unsigned levels_of_an_acl = 8;
-
 bool is_deleted(const mdb_db_change *change)
 {
     return change->mdc_change_type == mdct_delete;

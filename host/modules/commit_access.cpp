@@ -6,6 +6,22 @@
 
 namespace ovhost
 {
+namespace
+{
+
+void write(const md_dbinfo *dbinfo, int operation, bn_type type, const char *text,
+           const std::string &node)
+{
+    // The checks of a commit may write the database that it proposes.
+    auto *const newdb = const_cast<mdb_db *>(dbinfo->newdb);
+    const int err =
+        mdb_set_node_str(dbinfo->commit, newdb, operation, 0, type, text, "%s", node.c_str());
+    if (err != 0) {
+        throw std::runtime_error("cannot write " + node + ": error code " + std::to_string(err));
+    }
+}
+
+} // namespace
 
 std::vector<std::string> name_parts(const mdb_db_change *change)
 {
@@ -57,13 +73,12 @@ int refuse(const md_dbinfo *dbinfo, const std::string &message)
 void propose(const md_dbinfo *dbinfo, const std::string &node, bn_type type,
              const std::string &text)
 {
-    // The checks of a commit may write the database that it proposes.
-    auto *const newdb = const_cast<mdb_db *>(dbinfo->newdb);
-    const int err = mdb_set_node_str(dbinfo->commit, newdb, bsso_modify, 0, type, text.c_str(),
-                                     "%s", node.c_str());
-    if (err != 0) {
-        throw std::runtime_error("cannot write " + node + ": error code " + std::to_string(err));
-    }
+    write(dbinfo, bsso_modify, type, text.c_str(), node);
+}
+
+void propose_removal(const md_dbinfo *dbinfo, const std::string &node)
+{
+    write(dbinfo, bsso_delete, bt_none, nullptr, node);
 }
 
 void propose_missing(const md_dbinfo *dbinfo, const std::string &node, bn_type type,

@@ -34,6 +34,10 @@ namespace ovhost
 void propose(const md_dbinfo *dbinfo, const std::string &node, bn_type type,
              const std::string &text);
 
+/// Removes a node and all below it from the database that the commit proposes. Throws
+/// std::runtime_error.
+void propose_removal(const md_dbinfo *dbinfo, const std::string &node);
+
 /// Writes the node when it holds no value in the proposed database.
 void propose_missing(const md_dbinfo *dbinfo, const std::string &node, bn_type type,
                      const std::string &text);

@@ -1,11 +1,19 @@
 #pragma once
 // The module of the DNS-proxy maps. The library has limits for them and nothing else; these leave
-// no room for a map with a node of its own.
+// no room for a map. What a store holds of them from elsewhere can be shown, changed and deleted.
+//
+//   /ov/dnsproxy/config/0/map/MAP                string  MAP again
+//   /ov/dnsproxy/config/0/map/MAP/prio/PRIORITY  uint16  PRIORITY again, 1 to 65535
+//
+// "0" is the VRF. The library counts the maps of that one alone, so that there are none of others.
 
 #include "host/commit/module.h"
 
 namespace ovhost
 {
+
+/// The maps are children of the nodes that match.
+inline constexpr const char *dns_proxy_pattern = "/ov/dnsproxy/config/*/map";
 
 class DnsProxyMapsModule : public Module
 {

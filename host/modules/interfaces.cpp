@@ -1,6 +1,7 @@
 #include "host/modules/interfaces.h"
 
 #include "framework/appliance.h"
+#include "host/framework/match_string.h"
 #include "host/modules/commit_access.h"
 #include "host/modules/match_strings.h"
 #include "host/modules/node_access.h"
@@ -60,16 +61,16 @@ int InterfaceLabelsModule::check_change(md_dbinfo *dbinfo, mdb_db_change *change
 {
     const std::string label = name_parts(change).back();
     if (!is_deleted(change)) {
-        const auto fault = plain_name_fault("an interface label", label);
+        const auto fault = plain_name_fault("an interface label", label, longest_label);
         return fault ? refuse(dbinfo, *fault) : 0;
     }
     // Another category may still have it.
-    const std::optional<MapEntry> user = md_xmap_iflabel_check(label.c_str(), dbinfo->newdb)
-                                             ? std::nullopt
-                                             : entry_that_matches_vlan(dbinfo->newdb, label);
-    return user ? refuse(dbinfo, "Cannot delete an interface label when used by a " +
-                                     std::string(user->kind->name) + ".\n  Please remove " +
-                                     "vlan:" + label + " from " + describe(*user) + " first.")
+    const std::optional<MatchingEntry> user = md_xmap_iflabel_check(label.c_str(), dbinfo->newdb)
+                                                  ? std::nullopt
+                                                  : entry_that_matches_vlan(dbinfo->newdb, label);
+    return user ? refuse(dbinfo, "Cannot delete an interface label when used by " + user->owner +
+                                     ".\n  Please remove vlan:" + label + " from " + user->entry +
+                                     " first.")
                 : 0;
 }
 

@@ -3,7 +3,8 @@
 // prefer.
 //
 //   /ov/tunneld/net/interface/tunnel/vlan/config/NAME  a VLAN, kept while a route map prefers it
-//   /ov/iflabels/config/CATEGORY/LABEL                 a label, kept while a map matches by it
+//   /ov/iflabels/config/CATEGORY/LABEL                 a label, kept while a map or an ACL
+//                                                      matches by it
 //   /ov/tunneld/net/routes/config/ipv4/prefix/PREFIX/nhop/ADDRESS/preferred_if
 //                                                      the interface that a next hop prefers; the
 //                                                      last one is kept while a route map goes by

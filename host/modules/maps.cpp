@@ -1,5 +1,6 @@
 #include "host/modules/maps.h"
 
+#include "host/modules/acl_references.h"
 #include "host/modules/commit_access.h"
 #include "host/modules/map_checks.h"
 #include "host/modules/match_strings.h"
@@ -10,12 +11,23 @@ namespace ovhost
 namespace
 {
 
-/// Deep enough for an entry's older form, "prio/10/match/0/source/addr/ipv4/static/mask_len".
-constexpr unsigned levels_of_a_map = 12;
-
-std::string matchstr_pattern(const MapKind &kind)
+std::string match_pattern(const MapKind &kind, const char *leaf)
 {
-    return std::string(kind.root_pattern) + "/*/prio/*/" + kind.match + "/matchstr";
+    return std::string(kind.root_pattern) + "/*/prio/*/" + kind.match + "/" + leaf;
+}
+
+/// The library looks for a record when an entry goes and when it names another ACL. An entry that
+/// is replaced, or loses the node that names its ACL alone, would leave it for ever.
+void follow_lost_acl(const MapKind &kind, const md_dbinfo *dbinfo, const mdb_db_change *change,
+                     const MapChange &changed)
+{
+    if (!matches(change, match_pattern(kind, "acl"))) {
+        return;
+    }
+    const MapEntry entry{&kind, changed.map, *changed.priority};
+    if (const std::string acl = acl_of(dbinfo->olddb, entry); !acl.empty()) {
+        forget_reference(dbinfo, acl, entry);
+    }
 }
 
 } // namespace
@@ -42,7 +54,7 @@ int MapsModule::check_change(md_dbinfo *dbinfo, mdb_db_change *change)
         err != 0 || refused) {
         return err;
     }
-    if (!is_deleted && matches(change, matchstr_pattern(kind_))) {
+    if (!is_deleted && matches(change, match_pattern(kind_, "matchstr"))) {
         const MatchStringVerdict verdict = check_match_string(dbinfo, change);
         if (verdict.code != 0 || verdict.refused) {
             return verdict.code;
@@ -51,7 +63,9 @@ int MapsModule::check_change(md_dbinfo *dbinfo, mdb_db_change *change)
     if (const int err = md_acl_ref_processing(change, dbinfo, kind_.type); err != 0) {
         return err;
     }
-    if (!is_deleted) {
+    if (is_deleted) {
+        follow_lost_acl(kind_, dbinfo, change, *changed);
+    } else {
         complete_map(kind_, dbinfo, *changed);
     }
     return 0;

@@ -1,9 +1,8 @@
 #pragma once
 // Match strings of map and ACL entries in a commit: whether the library takes them, and which
-// entries of maps say that they match a VLAN or an interface label.
+// entries of maps and ACLs say that they match a VLAN or an interface label.
 
 #include "framework/md_commit.h"
-#include "host/modules/acl_references.h"
 
 #include <optional>
 #include <string>
@@ -20,8 +19,14 @@ struct MatchStringVerdict {
 /// Has the library check the changed node's match string.
 [[nodiscard]] MatchStringVerdict check_match_string(md_dbinfo *dbinfo, const mdb_db_change *change);
 
-/// The first entry of a map whose match string has a pair vlan:NAME.
-[[nodiscard]] std::optional<MapEntry> entry_that_matches_vlan(const mdb_db *db,
-                                                              const std::string &name);
+/// An entry as messages tell it.
+struct MatchingEntry {
+    std::string owner; ///< "a route-map"
+    std::string entry; ///< "route-map m1, entry 10"
+};
+
+/// The first entry of a map, or else of an ACL, whose match string has a pair vlan:NAME.
+[[nodiscard]] std::optional<MatchingEntry> entry_that_matches_vlan(const mdb_db *db,
+                                                                   const std::string &name);
 
 } // namespace ovhost

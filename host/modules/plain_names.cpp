@@ -1,21 +1,28 @@
 #include "host/modules/plain_names.h"
 
 #include "host/modules/node_access.h"
+#include "host/support/printable.h"
 
 namespace ovhost
 {
 
-std::optional<std::string> plain_name_fault(const char *thing, const std::string &name)
+std::optional<std::string> plain_name_fault(const char *thing, const std::string &name,
+                                            std::size_t longest)
 {
-    if (name.empty() || name.size() > longest_plain_name) {
-        return std::string(thing) + " is 1 to " + std::to_string(longest_plain_name) +
-               " bytes long, not " + std::to_string(name.size());
+    if (name.empty() || name.size() > longest) {
+        return std::string(thing) + " is 1 to " + std::to_string(longest) + " bytes long, not " +
+               std::to_string(name.size());
     }
     const std::size_t position = name.find_first_of("/\\*");
-    if (position == std::string::npos) {
-        return std::nullopt;
+    if (position != std::string::npos) {
+        return std::string(thing) + " must not hold \"" + name[position] +
+               "\": choose another name";
     }
-    return std::string(thing) + " must not hold \"" + name[position] + "\": choose another name";
+    if (const std::string shown = printable(name); shown != name) {
+        return std::string(thing) + " must not hold control characters, as \"" + shown +
+               "\" does: choose another name";
+    }
+    return std::nullopt;
 }
 
 std::optional<std::string> entry_number_fault(const char *thing, const std::string &number)

@@ -13,7 +13,8 @@ inline constexpr std::size_t longest_plain_name = 255;
 
 /// What is wrong with the name of something; `thing` begins the sentence, such as "an ACL's name".
 [[nodiscard]] std::optional<std::string> plain_name_fault(const char *thing,
-                                                          const std::string &name);
+                                                          const std::string &name,
+                                                          std::size_t longest = longest_plain_name);
 
 /// What is wrong with a number that an entry has for its name: it must be written as 1 to 65535
 /// are.
