@@ -96,7 +96,9 @@ DefaultFile::DefaultFile(const std::string &path, Reader read)
     const int err = read(&value_array_.entries, &value_array_.count, &removal_array_.entries,
                          &removal_array_.count);
     Candidate scratch;
-    faults_ = load_text(scratch, text.value_or("")).faults;
+    LoadResult loaded = load_text(scratch, text.value_or(""), CommaRule::ends_value);
+    faults_ = std::move(loaded.faults);
+    cut_values_ = std::move(loaded.cut);
     // The model's reader keeps all of its entries when the last line is bad.
     const bool are_kept = err != 0 && value_array_.count == 0 && removal_array_.count == 0;
     if (are_kept && !faults_.empty()) {

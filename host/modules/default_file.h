@@ -39,6 +39,9 @@ class DefaultFile
     /// their types, or that no module takes, nor with what stands behind a NUL byte.
     [[nodiscard]] const std::vector<LineFault> &faults() const { return faults_; }
 
+    /// Good lines whose values the format has ended at a comma, in their order.
+    [[nodiscard]] const std::vector<LineFault> &cut_values() const { return cut_values_; }
+
     /// The entries of the good lines, in their order.
     [[nodiscard]] std::span<const Entry> values() const { return values_; }
     [[nodiscard]] std::span<const Entry> removals() const { return removals_; }
@@ -64,6 +67,7 @@ class DefaultFile
     std::vector<Entry> values_;
     std::vector<Entry> removals_;
     std::vector<LineFault> faults_;
+    std::vector<LineFault> cut_values_;
 };
 
 } // namespace ovhost

@@ -114,6 +114,9 @@ void apply_source(const FileSource &source, Candidate &candidate, const Defaults
     }
     const DefaultFile file(path, source.read);
     report_faults(source, file.faults(), report);
+    for (const LineFault &cut : file.cut_values()) {
+        report.warning(path + ", " + describe(cut) + "; it ends before the comma");
+    }
     for (const auto &[line, value] : file.values()) {
         summary.set += !candidate.set(value->bv_name, value->bv_type, value->bv_value).has_value();
     }

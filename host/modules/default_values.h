@@ -24,7 +24,7 @@ struct DefaultsSummary {
 struct DefaultsReport {
     std::function<void(const DefaultsSummary &)> summary;
     /// A line of the debugging or preserved file that is left out: one bad line must not cost the
-    /// appliance the rest of them.
+    /// appliance the rest of them. And a line of any file whose value ends at a comma.
     std::function<void(const std::string &)> warning;
 };
 

@@ -4,9 +4,9 @@
 // entries (orvale/md_xmap_common.h); load_text.h reads the text.
 //
 // The file counts over what is in force: each of its nodes is set, what it removes is removed, and
-// the match of each of its entries takes the place of the one in force. Everything else stays. The
-// text's entries are converted by themselves, for the conversion of an entry that has a match
-// string already would leave it with "any".
+// the match of each of its entries takes the place of the one in force, unless the file says
+// nothing of it. Everything else stays. The text's entries are converted by themselves, for the
+// conversion of an entry that has a match string already would leave it with "any".
 
 #include "host/commit/candidate.h"
 #include "host/modules/load_text.h"
@@ -20,7 +20,7 @@ namespace ovhost
 
 struct LegacyUpgrade {
     std::size_t converted = 0; ///< entries that match by a match string now
-    std::size_t by_acl = 0;    ///< entries that match by an ACL, as before
+    std::size_t by_acl = 0;    ///< entries that match by an ACL, as before; others keep their match
     /// All that is wrong with the lines, or else with the entries: these have no line.
     std::vector<LineFault> line_faults;
     std::vector<LineFault> entry_faults;

@@ -4,6 +4,8 @@
 #include "host/support/utf8.h"
 #include "host/tree/name.h"
 
+#include <algorithm>
+#include <iterator>
 #include <optional>
 
 namespace ovhost
@@ -97,7 +99,19 @@ void apply_line(Candidate &candidate, const std::string &line, long number, Load
         result.faults.push_back({number, name, without_name(*std::move(fault), name)});
         return;
     }
+    if (kind == ov_defdb_value && fields.value.text[fields.value.length] == ',') {
+        result.cut.push_back({number, to_string(fields.name),
+                              "a value in a file cannot hold a comma; use ovctl set"});
+    }
     ++(kind == ov_defdb_value ? result.set : result.removed);
+}
+
+/// In the order of lines.
+void make_faults_of_cuts(LoadResult &result)
+{
+    std::ranges::move(result.cut, std::back_inserter(result.faults));
+    result.cut.clear();
+    std::ranges::sort(result.faults, {}, &LineFault::line);
 }
 
 } // namespace
@@ -109,7 +123,7 @@ ov_defdb_line_kind entry_kind(const char *line)
     return kind == ov_defdb_comment || form_fault(kind, fields_of(start)) ? ov_defdb_comment : kind;
 }
 
-LoadResult load_text(Candidate &candidate, std::string_view text)
+LoadResult load_text(Candidate &candidate, std::string_view text, CommaRule rule)
 {
     LoadResult result;
     Candidate edited = candidate;
@@ -118,6 +132,9 @@ LoadResult load_text(Candidate &candidate, std::string_view text)
         const std::size_t end = text.find('\n');
         apply_line(edited, std::string(text.substr(0, end)), ++number, result);
         text.remove_prefix(end == std::string_view::npos ? text.size() : end + 1);
+    }
+    if (rule == CommaRule::is_fault) {
+        make_faults_of_cuts(result);
     }
     if (result.faults.empty()) {
         candidate = std::move(edited);

@@ -20,10 +20,15 @@ struct LineFault {
     bool operator==(const LineFault &) const = default;
 };
 
+/// What becomes of a line whose value holds a comma. The format has no quoting: the value ends
+/// there. To people who write lines it is a loss, and a match string that ends early matches more.
+enum class CommaRule { is_fault, ends_value };
+
 struct LoadResult {
     std::size_t set = 0;
     std::size_t removed = 0;
     std::vector<LineFault> faults;
+    std::vector<LineFault> cut; ///< lines whose values have ended at a comma, by that rule
 };
 
 /// What the readers of the default databases make of a line, which to them ends at a NUL byte: an
@@ -32,6 +37,7 @@ struct LoadResult {
 
 /// Applies the text to the candidate, or leaves the candidate alone when any line has a fault; then
 /// all of them are told. Removing a node that is not there is no fault.
-[[nodiscard]] LoadResult load_text(Candidate &candidate, std::string_view text);
+[[nodiscard]] LoadResult load_text(Candidate &candidate, std::string_view text,
+                                   CommaRule rule = CommaRule::is_fault);
 
 } // namespace ovhost
