@@ -65,6 +65,7 @@ Configuration::Configuration(const std::filesystem::path &state_dir, const Histo
 {
     // Order counts: checks refuse before anything follows, and events tell of what is done.
     engine_.add_module(schema_);
+    engine_.add_module(name_depth_);
     engine_.add_module(model_);
     engine_.add_module(tunnels_);
     // Maps look for the ACLs that they name.

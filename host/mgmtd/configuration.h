@@ -17,6 +17,7 @@
 #include "host/modules/limits.h"
 #include "host/modules/maps.h"
 #include "host/modules/model.h"
+#include "host/modules/name_depth.h"
 #include "host/modules/net_interfaces.h"
 #include "host/modules/routes.h"
 #include "host/modules/schema.h"
@@ -91,6 +92,7 @@ class Configuration
     Store store_;
     StoreAdapter adapter_;
     SchemaModule schema_;
+    NameDepthModule name_depth_;
     ModelModule model_;
     TunnelsModule tunnels_;
     AclsModule acls_;
