@@ -183,8 +183,9 @@ TEST_F(Maps, ThatCannotBeUpgradedLeaveEverythingAsItIs)
     const std::string file = (dir_ / "legacy.db").string();
     EXPECT_EQ(ovctl({"upgrade", file}),
               refused("mgmtd refused the file " + file + ":\n  " + entry_match("wan", "10") +
-                      ": it cannot be converted (error code 14020, type conversion failed); an "
-                      "IPv4 address needs a mask such as 255.255.0.0 or a length such as 16\n"));
+                      ": an IPv4 address needs a mask such as 255.255.0.0 or a length such as 16, "
+                      "and source/addr/ipv4/static/mask_len is \"255.0.255.0\" (error code 14020, "
+                      "type conversion failed)\n"));
     EXPECT_EQ(read_file(file), text);
     EXPECT_EQ(ovctl({"diff"}), done());
     EXPECT_EQ(ovctl({"get", "/a"}).exit_code, 1);

@@ -137,10 +137,10 @@ constexpr ValueCase value_cases[] = {
     {"vlan:", false},
     {"vlan:a name with blanks", true},
     {"vlan:*", false},
-    {"vlan:\\*", true},
+    {"vlan:\\*", false},
     {"vlan:wan*", true},
     {"vlan:a/b", false},
-    {"vlan:a\\/b", true},
+    {"vlan:a\\/b", false},
     {"vlan:*/*", false},
     {"vlan:/", false},
     {"vlan:a\\", false},
@@ -163,6 +163,13 @@ TEST_F(MatchStringOperation, ValuesByKey)
     }
 }
 
+TEST_F(MatchStringOperation, ALabelIsNoLongerThanTheLibraryCanLookUp)
+{
+    const std::string longest = "vlan:" + std::string(233, 'l');
+    EXPECT_EQ(validate(longest.c_str()), 0);
+    EXPECT_EQ(validate((longest + "l").c_str()), 14012);
+}
+
 TEST_F(MatchStringOperation, ReasonsNameThePairAndSayWhatToWrite)
 {
     const std::pair<const char *, const char *> rows[] = {
@@ -182,8 +189,9 @@ TEST_F(MatchStringOperation, ReasonsNameThePairAndSayWhatToWrite)
                           "range such as 8000-8080"},
         {"src_ip:10.1", "pair \"src_ip:10.1\": the value must be an address and a mask length, "
                         "such as 10.1.0.0/16"},
-        {"vlan:", "pair \"vlan:\": the value must be a label or a VLAN's name, which is not *, "
-                  "with any slash in it written as \\/"},
+        {"vlan:",
+         "pair \"vlan:\": the value must be a label or a VLAN's name: 1 to 233 bytes without "
+         "slash and backslash, and not * alone"},
         {"tbehavior:", "pair \"tbehavior:\": the value must be a text that is not empty"},
         {"protocol:a/b", "pair \"protocol:a/b\": the value must be a number from 0 to 255 or a "
                          "protocol's name such as tcp"},

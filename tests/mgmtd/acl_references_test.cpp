@@ -74,9 +74,11 @@ TEST_P(References, MayBeMissing)
     put_acl("a1");
     put_entry("10", "a1");
     put_entry("20", "a2");
-    EXPECT_THAT(faults(), ElementsAre("a1 m1 10: the entry names the ACL, but there is no record",
-                                      "a2 m1 20: the entry names the ACL, but there is no such "
-                                      "ACL"));
+    EXPECT_THAT(faults(),
+                ElementsAre("a1 m1 10: the entry names the ACL, but there is no record; delete " +
+                                match("m1", "10", "acl") + ", commit, and set it again",
+                            "a2 m1 20: the entry names the ACL, but there is no such ACL; delete " +
+                                match("m1", "20", "acl") + ", commit, and set it again"));
 }
 
 TEST_P(References, MayBeStale)
@@ -88,8 +90,10 @@ TEST_P(References, MayBeStale)
     put_record("a1", "20");
     put_record("a2", "20");
     EXPECT_THAT(faults(),
-                ElementsAre("a1 m1 10: there is a record, but the entry names no ACL",
-                            "a1 m1 20: there is a record, but the entry names ACL \"a2\""));
+                ElementsAre("a1 m1 10: there is a record, but the entry names no ACL; delete " +
+                                record("a1", kind(), "m1", "10"),
+                            "a1 m1 20: there is a record, but the entry names ACL \"a2\"; delete " +
+                                record("a1", kind(), "m1", "20")));
     EXPECT_EQ(check_references(&db_).records, 3U);
 }
 
@@ -98,7 +102,8 @@ TEST_P(References, MayHoldSomethingElse)
     put_acl("a1");
     put_entry("10", "a1");
     put(record("a1", kind(), "m1", "10"), bt_uint32, "11");
-    EXPECT_THAT(faults(), ElementsAre("a1 m1 10: the record does not hold the priority"));
+    EXPECT_THAT(faults(), ElementsAre("a1 m1 10: the record does not hold the priority; delete " +
+                                      match("m1", "10", "acl") + ", commit, and set it again"));
 }
 
 TEST_P(References, AreNotKeptOfTheDefaultEntry)
@@ -108,7 +113,8 @@ TEST_P(References, AreNotKeptOfTheDefaultEntry)
     EXPECT_THAT(faults(), IsEmpty());
     put_record("a1", "65535");
     EXPECT_THAT(faults(),
-                ElementsAre("a1 m1 65535: there is a record, but the entry names no ACL"));
+                ElementsAre("a1 m1 65535: there is a record, but the entry names no ACL; delete " +
+                            record("a1", kind(), "m1", "65535")));
 }
 
 TEST_P(References, TellTheEntryThatTheyAreAbout)

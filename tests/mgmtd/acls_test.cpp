@@ -59,6 +59,9 @@ TEST_F(Acls, HavePlainNames)
     set(acl("a\\\\b"), "a\\b");
     EXPECT_EQ(commit_in_vain(), acl("a\\\\b") + ": an ACL's name must not hold \"\\\": choose "
                                                 "another name (acl)\n");
+    set(acl("a\nb"), "a\nb");
+    EXPECT_EQ(commit_in_vain(), acl("a\nb") + ": an ACL's name must not hold control characters, "
+                                              "as \"a\\nb\" does: choose another name (acl)\n");
     set(acl("\\*"), "*");
     EXPECT_EQ(commit_in_vain(), acl("\\*") + ": an ACL's name must not hold \"*\": choose another "
                                              "name (acl)\n");
@@ -200,18 +203,41 @@ TEST_F(Acls, TellTheFirstTenOfTheirUsers)
               expected + "\n  Used by route-map m1, entry 10.\n  And 3 more. (acl)\n");
 }
 
-TEST_F(Acls, DoNotCountStaleRecordsAmongTheirUsers)
+TEST_F(Acls, DoNotCountAmongTheirUsersWhoLetGoOfThem)
 {
     add_acl("a1");
     add_entry("m1", "10", "a1");
     add_entry("m1", "20", "a1");
     ASSERT_EQ(commit(), "committed");
-    erase(rmap("m1/prio/10/match/0/acl"));
-    ASSERT_EQ(commit(), "committed");
     erase(acl("a1"));
+    erase(rmap("m1/prio/10/match/0/acl"));
     EXPECT_EQ(commit_in_vain(), acl("a1") + ": Cannot delete an ACL when used by a route-map.\n"
                                             "  Please remove ACL from associated route-map first.\n"
                                             "  Used by route-map m1, entry 20. (acl)\n");
+}
+
+TEST_F(Acls, GoThoughADefaultEntryNamesThem)
+{
+    add_acl("a1");
+    add_entry("m1", "65535", "a1");
+    ASSERT_EQ(commit(), "committed");
+    erase(acl("a1"));
+    EXPECT_EQ(commit(), "committed");
+}
+
+// The module of ACLs does not see nodes that are deeper.
+TEST_F(Acls, AreEightLevelsDeep)
+{
+    set(acl("a1/b/c/d/e/f/g/h"), "x");
+    EXPECT_EQ(commit(), "committed");
+    EXPECT_EQ(value(acl("a1")), "string a1");
+    for (const char *node :
+         {"a1/b/c/d/e/f/g/h/i", "a1/rmap/m1/prio/99/a/b/c/d", "\\*/b/c/d/e/f/g/h/i"}) {
+        set(acl(node), "x");
+        EXPECT_EQ(commit_in_vain(),
+                  acl(node) +
+                      ": too deep: a name in here has 12 parts at most, not 13 (name-depth)\n");
+    }
 }
 
 TEST_F(Acls, HaveNoReferencesThatUsersWrite)
@@ -266,9 +292,8 @@ TEST_F(Acls, KeepTheReferencesThatCount)
                                     advice + acl("a1/rmap/m1/prio/20") + kept +
                                     "route-map m1, entry 20" + advice);
     erase(rmap("m1/prio/10/match/0/acl"));
-    ASSERT_EQ(commit(), "committed");
     erase(acl("a1/rmap/m1/prio/10"));
-    EXPECT_EQ(commit(), "committed") << "it did not count any more";
+    EXPECT_EQ(commit(), "committed") << "it does not count any more";
     EXPECT_THAT(records(), ElementsAre("a1/rmap/m1/20"));
 }
 

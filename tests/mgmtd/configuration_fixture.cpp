@@ -1,5 +1,9 @@
 #include "tests/mgmtd/configuration_fixture.h"
 
+#include "host/commit/commit_store.h"
+#include "host/tree/diff.h"
+#include "host/tree/name.h"
+
 namespace mgmtd_test
 {
 
@@ -10,6 +14,26 @@ void ConfigurationTest::restart()
     configuration_.reset();
     configuration_.emplace(state_.path());
     configuration_->start();
+}
+
+void ConfigurationTest::put_in_store(const std::string &node, bn_type type,
+                                     const std::optional<std::string> &value)
+{
+    configuration_.reset();
+    {
+        Store store = Store::open(state_.path());
+        StoreAdapter adapter(store);
+        const Tree before = load_tree(adapter);
+        Tree after = before;
+        const auto parts = split_name(node).value();
+        if (value) {
+            after.set(parts, {type, *value});
+        } else {
+            EXPECT_TRUE(after.erase(parts)) << node;
+        }
+        (void)adapter.commit(stored_changes(diff(before, after)), {});
+    }
+    restart();
 }
 
 void ConfigurationTest::set(const std::string &node, bn_type type, const std::string &value)

@@ -17,6 +17,11 @@ class ConfigurationTest : public DaemonTest
     /// Ends the daemon and starts it again on its store.
     void restart();
 
+    /// Starts the daemon on a store that holds one more value, or another one, that no module has
+    /// seen; without a text, one less.
+    void put_in_store(const std::string &node, bn_type type,
+                      const std::optional<std::string> &value);
+
     /// Edits of the candidate, which must be possible.
     void set(const std::string &node, bn_type type, const std::string &value);
     void set(const std::string &node, const std::string &text) { set(node, bt_string, text); }

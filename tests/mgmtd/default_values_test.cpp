@@ -378,6 +378,21 @@ TEST_F(FirstStart, StoresNothingWhenAModuleRefuses)
     EXPECT_TRUE(read_file(preserved_file));
 }
 
+TEST_F(DefaultValues, WarnOfAValueThatEndsAtAComma)
+{
+    set_config_name("m1");
+    write_file(model_file, "/x/m,string,a,b\n");
+    write_file(debug_file, "/x/d,string,c\n/x/e,string,,f\n");
+    apply();
+    EXPECT_EQ(value("/x/m"), "string a");
+    EXPECT_EQ(value("/x/d"), "string c");
+    EXPECT_EQ(value("/x/e"), "string ");
+    const std::string words =
+        ": a value in a file cannot hold a comma; use ovctl set; it ends before the comma";
+    EXPECT_THAT(warnings_, ElementsAre("/opt/orvale/defdb.conf.m1, line 1: /x/m" + words,
+                                       "/var/opt/tms/.debug_default_db, line 2: /x/e" + words));
+}
+
 TEST_F(FirstStart, KeepsPreservedValuesOfWhichSomeWereLeftOut)
 {
     const std::string text = "/x/good,string,1\n/ov/tunneld/system/config/mode,string,brigde\n";

@@ -113,11 +113,41 @@ TEST_F(InterfaceLabelNames, ArePlain)
     set("/ov/iflabels/config/lan/a\\/b", "1");
     EXPECT_EQ(commit_in_vain(), "/ov/iflabels/config/lan/a\\/b: an interface label must not hold "
                                 "\"/\": choose another name (interface-label)\n");
-    const std::string too_long(256, 'l');
-    set("/ov/iflabels/config/lan/" + too_long, "1");
-    EXPECT_EQ(commit_in_vain(), "/ov/iflabels/config/lan/" + too_long +
-                                    ": an interface label is 1 to 255 bytes long, not 256 "
+    set("/ov/iflabels/config/lan/a\nb", "1");
+    EXPECT_EQ(commit_in_vain(), "/ov/iflabels/config/lan/a\nb: an interface label must not hold "
+                                "control characters, as \"a\\nb\" does: choose another name "
+                                "(interface-label)\n");
+}
+
+// Behind 255 characters the library's "/ov/iflabels/config/*/LABEL" would be of another label.
+TEST_F(InterfaceLabelNames, AreAsLongAsTheLibraryCanLookThemUp)
+{
+    const std::string longest(233, 'l');
+    set("/ov/iflabels/config/lan/" + longest, "1");
+    set(rmap("m1/prio/10/match/0/matchstr"), "vlan:" + longest);
+    EXPECT_EQ(commit(), "committed");
+    set(rmap("m1/prio/10/match/0/matchstr"), "vlan:" + longest + "l");
+    EXPECT_NE(commit_in_vain(), "committed");
+    set("/ov/iflabels/config/lan/" + longest + "l", "1");
+    EXPECT_EQ(commit_in_vain(), "/ov/iflabels/config/lan/" + longest +
+                                    "l: an interface label is 1 to 233 bytes long, not 234 "
                                     "(interface-label)\n");
+}
+
+TEST_F(InterfaceLabelNames, StayWhileAnAclMatchesByThem)
+{
+    const std::string label = "/ov/iflabels/config/wan/a long label with blanks";
+    set(label, "1");
+    set(acl("a1/entry/10/matchstr"), "dst_port:80,vlan:a long label with blanks");
+    ASSERT_EQ(commit(), "committed");
+    erase(label);
+    EXPECT_EQ(commit_in_vain(), label +
+                                    ": Cannot delete an interface label when used by an ACL.\n"
+                                    "  Please remove vlan:a long label with blanks from ACL a1, "
+                                    "entry 10 first. (interface-label)\n");
+    erase(label);
+    erase(acl("a1/entry/10"));
+    EXPECT_EQ(commit(), "committed");
 }
 
 class PreferredInterfaces : public MapTest

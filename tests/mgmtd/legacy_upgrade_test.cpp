@@ -190,16 +190,58 @@ TEST_F(LegacyUpgradeTest, DoneTwiceChangesNothing)
     EXPECT_EQ(nodes(), first);
 }
 
-// The reference to an ACL outlives the removal of the ACL's node alone.
-TEST_F(LegacyUpgradeTest, DoesNotTakeTheAclFromAnEntryInForce)
+TEST_F(LegacyUpgradeTest, TakesTheAclFromAnEntryInForce)
 {
     const std::string entry = route_maps + "/m/prio/10";
     in_force(entry_text(entry, {"acl,string,a1"}));
-    EXPECT_THAT(upgrade(entry_text(entry, {"dscp,string,ef"})),
-                ElementsAre("0 " + entry +
-                            "/match/0|the entry in force matches by the ACL \"a1\" and the one of "
-                            "the file does not; delete the entry, commit, and upgrade then"));
-    EXPECT_THAT(nodes(), ElementsAre(entry + "/match/0/acl string a1"));
+    EXPECT_THAT(upgrade(entry_text(entry, {"dscp,string,ef"})), ElementsAre("1/0"));
+    EXPECT_THAT(nodes(), ElementsAre(entry + "/match/0/matchstr string dscp:ef"));
+}
+
+// Else a file that sets something else of an entry would have it match everything.
+TEST_F(LegacyUpgradeTest, KeepsTheMatchInForceOfAnEntryThatSaysNothingOfIt)
+{
+    const std::string entry = route_maps + "/m/prio/";
+    in_force(entry_text(entry + "10", {"matchstr,string,dst_port:80"}) +
+             entry_text(entry + "20", {"acl,string,a1"}) + entry + "30,uint16,30\n");
+    EXPECT_THAT(upgrade(entry + "10/set/0/x,string,1\n" + entry + "20,uint16,20\n" + entry +
+                        "20/match/0,string,0\n" + entry + "30/note,string,n\n" + entry +
+                        "40,uint16,40\n"),
+                ElementsAre("1/0"));
+    EXPECT_THAT(nodes(),
+                ElementsAre(entry + "10/match/0/matchstr string dst_port:80",
+                            entry + "10/set/0/x string 1", entry + "20 uint16 20",
+                            entry + "20/match/0 string 0", entry + "20/match/0/acl string a1",
+                            entry + "30 uint16 30", entry + "30/note string n",
+                            entry + "40 uint16 40", entry + "40/match/0/matchstr string any"));
+}
+
+// Passed over, a field that narrows an entry down would be lost.
+TEST_F(LegacyUpgradeTest, RefusesFieldsThatItDoesNotKnow)
+{
+    const std::string entry = route_maps + "/m/prio/";
+    const std::string advice =
+        "\", and without it the entry would match more; mend its name, or remove it";
+    EXPECT_THAT(
+        upgrade(entry_text(entry + "10", {"dscp,string,ef", "dest/prot,string,80"}) +
+                entry_text(entry + "20", {"a\\/b,string,x"}) +
+                entry_text(entry + "30", {"source/addr/ipv4/static,string,x"}) +
+                entry_text(entry + "40", {"acl,string,a1", "protocols,string,tcp"})),
+        ElementsAre("0 " + entry + "10/match/0|an upgrade knows no field \"dest/prot" + advice,
+                    "0 " + entry + "20/match/0|an upgrade knows no field \"a\\/b" + advice,
+                    "0 " + entry +
+                        "30/match/0|an upgrade knows no field \"source/addr/ipv4/static" + advice,
+                    "0 " + entry + "40/match/0|an upgrade knows no field \"protocols" + advice));
+    EXPECT_THAT(nodes(), IsEmpty());
+}
+
+TEST_F(LegacyUpgradeTest, RefusesValuesWithCommas)
+{
+    EXPECT_THAT(upgrade(entry_text(route_maps + "/m/prio/10", {"application,string,a,dscp:ef"})),
+                ElementsAre("1 " + route_maps +
+                            "/m/prio/10/match/0/application|a value in a file cannot hold a "
+                            "comma; use ovctl set"));
+    EXPECT_THAT(nodes(), IsEmpty());
 }
 
 TEST_F(LegacyUpgradeTest, RefusesEveryBadLine)
@@ -229,13 +271,13 @@ TEST_F(LegacyUpgradeTest, NamesTheEntryOfEachKindThatCannotBeConverted)
                 entry_text(route_maps + "/m/prio/30", {"dscp,string,ef"}) +
                 entry_text(opt_maps + "/m/prio/5", no_mask)),
         ElementsAre("0 " + route_maps +
-                        "/m/prio/20/match/0|it cannot be converted (error code 14020, type "
-                        "conversion failed); an IPv4 address needs a mask such as 255.255.0.0 or a "
-                        "length such as 16",
+                        "/m/prio/20/match/0|an IPv4 address needs a mask such as 255.255.0.0 or a "
+                        "length such as 16, and source/addr/ipv4/static/mask_len is "
+                        "\"255.0.255.0\" (error code 14020, type conversion failed)",
                     "0 " + opt_maps +
-                        "/m/prio/5/match/0|it cannot be converted (error code 14001, unexpected "
-                        "NULL); an IPv4 address needs a mask such as 255.255.0.0 or a length such "
-                        "as 16"));
+                        "/m/prio/5/match/0|an IPv4 address needs a mask such as 255.255.0.0 or a "
+                        "length such as 16, and dest/addr/ipv4/static/mask_len is missing (error "
+                        "code 14001, unexpected NULL)"));
     EXPECT_THAT(nodes(), ElementsAre("/a string before"));
 }
 
@@ -377,6 +419,16 @@ TEST_F(UpgradeRequest, RecordsTheReferencesOfItsAcls)
     EXPECT_EQ(value_in(configuration_.running(), reference + "10"), "uint32 10");
     EXPECT_EQ(value_in(configuration_.running(), reference + "20"), "none");
     EXPECT_EQ(value_in(configuration_.running(), reference + "65535"), "none");
+    // The entry's end of matching by the ACL ends the reference.
+    (void)upgrade(entry_text(route_maps + "/m/prio/10", {"dscp,string,ef"}));
+    EXPECT_EQ(value_in(configuration_.running(), reference + "10"), "none");
+    (void)upgrade(entry_text(route_maps + "/m/prio/10", {"acl,string,a1"}));
+    EXPECT_EQ(value_in(configuration_.running(), reference + "10"), "uint32 10");
+    // As does a line that removes its node.
+    (void)upgrade("-" + route_maps + "/m/prio/10/match/0/acl\n" +
+                  entry_text(route_maps + "/m/prio/30", {"dscp,string,ef"}));
+    EXPECT_EQ(value_in(configuration_.running(), reference + "10"), "none");
+    (void)upgrade(entry_text(route_maps + "/m/prio/10", {"acl,string,a1"}));
     // Another ACL for the entry takes its reference along.
     (void)upgrade("/ov/tunneld/acl/config/a2,string,a2\n" +
                   entry_text(route_maps + "/m/prio/10", {"acl,string,a2"}));
@@ -411,8 +463,8 @@ TEST_F(UpgradeRequest, StoresNothingWhenAnEntryCannotBeConverted)
                         entry_text(route_maps + "/m/prio/20", bad_mask)),
                 StartsWith("refused: entries cannot be upgraded; nothing was stored [0 " +
                            route_maps +
-                           "/m/prio/20/match/0|it cannot be converted (error code "
-                           "14020"));
+                           "/m/prio/20/match/0|an IPv4 address needs a mask such as 255.255.0.0 "
+                           "or a length such as 16, and "));
     expect_nothing_happened();
 }
 
@@ -424,7 +476,8 @@ TEST_F(UpgradeRequest, StoresNothingWhenAModuleRefuses)
                            "/m/prio/20/match/0/matchstr|Invalid match string dscp:64 - pair "
                            "\"dscp:64\": the value must be "));
     expect_nothing_happened();
-    EXPECT_THAT(refusal("/ov/tunneld/system/config/mode,string,brigde\n"),
+    EXPECT_THAT(refusal("/ov/tunneld/system/config/mode,string,brigde\n" +
+                        entry_text(route_maps + "/m/prio/10", {"dscp,string,ef"})),
                 StartsWith("refused: the upgraded configuration is refused "
                            "[0 /ov/tunneld/system/config/mode|"));
     expect_nothing_happened();
@@ -453,7 +506,15 @@ TEST_F(UpgradeRequest, WaitsForTheEditsOfTheCandidate)
 TEST_F(UpgradeRequest, NeedsAText)
 {
     EXPECT_THROW((void)ask({{"command", "upgrade"}}), RequestError);
-    EXPECT_EQ(upgrade("").at("changes"), json::array());
+}
+
+TEST_F(UpgradeRequest, NeedsEntries)
+{
+    for (const std::string text : {"", "# nothing\n", "/a,string,x\n", "-/ov/x\n"}) {
+        EXPECT_EQ(refusal(text), "refused: legacy.db has no map entries to convert; nothing was "
+                                 "stored (use load for a file of other nodes)");
+    }
+    expect_nothing_happened();
 }
 
 } // namespace

@@ -52,10 +52,23 @@ TEST_F(LoadText, SkipsLeadingBlanksAndKeepsTheRest)
     EXPECT_THAT(nodes(), ElementsAre("/a/b uint32 5", "/a/c string  x #y "));
 }
 
-TEST_F(LoadText, EndsAValueAtTheNextComma)
+TEST_F(LoadText, RefusesAValueWithAComma)
 {
-    EXPECT_THAT(load("/a/b,string,x,y"), ElementsAre("1/0"));
-    EXPECT_THAT(nodes(), ElementsAre("/a/b string x"));
+    const std::string fault = "|a value in a file cannot hold a comma; use ovctl set";
+    EXPECT_THAT(load("/a,string,x,y\n/b,nosuchtype,\n/c,string,,\n/d,string,z,\n/e,string,\n"),
+                ElementsAre("1 /a" + fault, "2 /b|unknown type \"nosuchtype\"", "3 /c" + fault,
+                            "4 /d" + fault));
+    EXPECT_THAT(nodes(), IsEmpty());
+}
+
+TEST_F(LoadText, EndsAValueAtTheNextCommaWhenThatIsTheRule)
+{
+    const LoadResult result =
+        load_text(candidate_, "/a,string,x,y\n/b,string,z\n", CommaRule::ends_value);
+    EXPECT_THAT(result.faults, IsEmpty());
+    EXPECT_THAT(result.cut, ElementsAre(LineFault{
+                                1, "/a", "a value in a file cannot hold a comma; use ovctl set"}));
+    EXPECT_THAT(nodes(), ElementsAre("/a string x", "/b string z"));
 }
 
 TEST_F(LoadText, TakesAMissingValueAsEmpty)
@@ -101,7 +114,7 @@ TEST_F(LoadText, RefusesACarriageReturnAtTheEndOfALine)
 {
     const std::string fault =
         "|the line ends with a carriage return: save the file with plain line ends";
-    EXPECT_THAT(load("/a,string,x\r\n/b,string,y,\r\n/c,string\r\n-/d\r\n\r\n/e,string,z\r"),
+    EXPECT_THAT(load("/a,string,x\r\n/b,string,y\r\n/c,string\r\n-/d\r\n\r\n/e,string,z\r"),
                 ElementsAre("1 " + fault, "2 " + fault, "3 " + fault, "4 " + fault, "5 " + fault,
                             "6 " + fault));
     EXPECT_THAT(nodes(), IsEmpty());

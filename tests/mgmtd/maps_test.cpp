@@ -80,14 +80,42 @@ TEST_P(Maps, TakeTheirRecordsAlong)
     EXPECT_EQ(value(map_node(kind(), "m2")), "none");
 }
 
-TEST_P(Maps, KeepTheRecordWhenOnlyTheAclsNodeGoes)
+TEST_P(Maps, LoseTheRecordWithTheAclsNode)
 {
     add_acl("a1");
-    set(match("m1", "10", "acl"), "a1");
+    for (const char *priority : {"10", "20", "30"}) {
+        set(match("m1", priority, "acl"), "a1");
+    }
     ASSERT_EQ(commit(), "committed");
     erase(match("m1", "10", "acl"));
     ASSERT_EQ(commit(), "committed");
-    EXPECT_THAT(records(), ElementsAre("a1/" + std::string(kind().key) + "/m1/10"));
+    const std::string key = kind().key;
+    EXPECT_THAT(records(), ElementsAre("a1/" + key + "/m1/20", "a1/" + key + "/m1/30"));
+    erase(entry("m1", "20") + "/match");
+    ASSERT_EQ(commit(), "committed");
+    EXPECT_THAT(records(), ElementsAre("a1/" + key + "/m1/30"));
+    erase(match("m1", "30", "acl"));
+    ASSERT_EQ(commit(), "committed");
+    EXPECT_THAT(records(), IsEmpty());
+    EXPECT_EQ(value(entry("m1", "30")), "uint16 30");
+}
+
+TEST_P(Maps, LoseTheRecordOfAnEntryThatIsReplacedWithoutAcl)
+{
+    add_acl("a1");
+    for (const char *priority : {"10", "20", "30"}) {
+        set(match("m1", priority, "acl"), "a1");
+    }
+    set(match("m2", "10", "acl"), "a1");
+    ASSERT_EQ(commit(), "committed");
+    erase(entry("m1", "10"));
+    set(match("m1", "10", "matchstr"), "any");
+    erase(entry("m1", "20"));
+    erase(map_node(kind(), "m2"));
+    set(match("m2", "10", "matchstr"), "any");
+    ASSERT_EQ(commit(), "committed");
+    EXPECT_THAT(records(), ElementsAre("a1/" + std::string(kind().key) + "/m1/30"));
+    EXPECT_EQ(value(entry("m2", "10")), "uint16 10");
 }
 
 TEST_P(Maps, KeepTheRecordOfAnEntryThatIsReplaced)
@@ -148,15 +176,21 @@ TEST_P(Maps, RefuseBadMatchStrings)
                   "colon; write key:value\n (" +
                   kind().name + ")\n");
     set(match("m1", "10", "matchstr"), "vlan:a\\/b");
-    EXPECT_EQ(commit_in_vain(), match("m1", "10", "matchstr") +
-                                    ": the VLAN of \"vlan:a\\/b\" is neither an interface label "
-                                    "nor a name that a VLAN can have (" +
-                                    kind().name + ")\n");
+    EXPECT_EQ(
+        commit_in_vain(),
+        match("m1", "10", "matchstr") +
+            ": Invalid match string vlan:a\\/b - pair \"vlan:a\\/b\": the value must be a label "
+            "or a VLAN's name: 1 to 233 bytes without slash and backslash, and not * alone\n "
+            "(" +
+            kind().name + ")\n");
     const std::string longest = "application:" + std::string(1023 - 12, 'a');
-    set(match("m1", "10", "matchstr"), longest + "a");
-    EXPECT_EQ(commit_in_vain(), match("m1", "10", "matchstr") + ": Invalid match string " +
-                                    longest + "a - it is longer than 1023 characters\n (" +
-                                    kind().name + ")\n");
+    for (const std::size_t length : {1024U, 1000000U}) {
+        set(match("m1", "10", "matchstr"), longest + std::string(length - 1023, 'a'));
+        EXPECT_EQ(commit_in_vain(),
+                  match("m1", "10", "matchstr") + ": Invalid match string application:" +
+                      std::string(60 - 12, 'a') + "... (" + std::to_string(length) +
+                      " bytes) - it is longer than 1023 characters\n (" + kind().name + ")\n");
+    }
     set(match("m1", "10", "matchstr"), longest);
     EXPECT_EQ(commit(), "committed");
 }
@@ -230,6 +264,11 @@ TEST_P(Maps, HavePlainNames)
         const char *name;
         const char *character;
     };
+    set(map_node(kind(), "a\nb"), "a\nb");
+    EXPECT_EQ(commit_in_vain(), map_node(kind(), "a\nb") +
+                                    ": a map's name must not hold control characters, as "
+                                    "\"a\\nb\" does: choose another name (" +
+                                    kind().name + ")\n");
     for (const auto &[name, character] :
          {Row{"a/b", "/"}, Row{"a\\b", "\\"}, Row{"*", "*"}, Row{"a*", "*"}}) {
         set(map_node(kind(), name), name);
@@ -237,6 +276,25 @@ TEST_P(Maps, HavePlainNames)
                                         character + "\": choose another name (" + kind().name +
                                         ")\n");
     }
+}
+
+// The modules of maps do not see nodes that are deeper.
+TEST_P(Maps, AreTwelveLevelsDeep)
+{
+    // Up to the map's own name there are 6 parts, of a security map 7; below are 11 more.
+    const std::string deepest = map_node(kind(), "m1") + "/prio/10/match/" +
+                                (kind().type == MAP_TYPE_SEC ? "b" : "0") + "/c/d/e/f/g/h/i";
+    const std::string most = kind().type == MAP_TYPE_SEC ? "18" : "17";
+    const std::string one_more = kind().type == MAP_TYPE_SEC ? "19" : "18";
+    set(deepest, "x");
+    EXPECT_EQ(commit(), "committed");
+    EXPECT_EQ(value(map_node(kind(), "m1")), "string m1");
+    set(deepest + "/j", "x");
+    EXPECT_EQ(commit_in_vain(), deepest + "/j: too deep: a name in here has " + most +
+                                    " parts at most, not " + one_more + " (name-depth)\n");
+    const std::string nasty = map_node(kind(), "a/b") + "/prio/0/c/d/e/f/g/h/i/j/k/l/m/n/o/p";
+    set(nasty, "x");
+    EXPECT_THAT(commit_in_vain(), testing::HasSubstr("too deep: "));
 }
 
 TEST_P(Maps, LeaveNothingOfARefusedCommit)
@@ -336,6 +394,8 @@ class SecurityMaps : public MapTest
 
 TEST_F(SecurityMaps, AreOneMap)
 {
+    set("/ov/tunneld/sec_map/config/map/map2/z1/prio/10/match/a/b/c/d/e/f/g/h/i/j", "x");
+    EXPECT_THAT(commit_in_vain(), testing::HasSubstr("too deep: "));
     set("/ov/tunneld/sec_map/config/map/map2/z1/prio/10/match/matchstr", "any");
     EXPECT_EQ(commit_in_vain(),
               "/ov/tunneld/sec_map/config/map/map2/z1/prio/10/match/matchstr: the one security map "
@@ -364,16 +424,55 @@ TEST_F(DnsProxyMaps, HaveNoRoomForAMap)
                                 "reached. (dns-proxy-map)\n");
 }
 
+TEST_F(DnsProxyMaps, DoNotComeWithTheirEntries)
+{
+    G_daemon_log_level = 2;
+    for (const char *below : {"d1/prio/10", "d1/prio/10/x", "d1/x"}) {
+        set(std::string("/ov/dnsproxy/config/0/map/") + below,
+            std::string(below).ends_with("10") ? bt_uint16 : bt_string, "10");
+        EXPECT_EQ(commit_in_vain(), "/ov/dnsproxy/config/0/map/d1: Cannot add map because maximum "
+                                    "reached. (dns-proxy-map)\n");
+    }
+}
+
 TEST_F(DnsProxyMaps, HaveEntriesAsTheModelAllowsAny)
 {
     G_daemon_log_level = 2;
-    set("/ov/dnsproxy/config/0/map/d1/prio/10", bt_uint16, "10");
+    put_in_store("/ov/dnsproxy/config/0/map/d1", bt_string, "d1");
+    set("/ov/dnsproxy/config/0/map/d1/prio/10/x", "x");
     EXPECT_EQ(commit(), "committed");
+    EXPECT_EQ(value("/ov/dnsproxy/config/0/map/d1/prio/10"), "uint16 10");
     set("/ov/model/limits/max_dns_proxy_map_entries", bt_uint32, "0");
     ASSERT_EQ(commit(), "committed");
     set("/ov/dnsproxy/config/0/map/d1/prio/20", bt_uint16, "20");
     EXPECT_EQ(commit_in_vain(), "/ov/dnsproxy/config/0/map/d1/prio/20: Cannot add map entry "
                                 "because maximum reached. (dns-proxy-map)\n");
+}
+
+TEST_F(DnsProxyMaps, HaveNamesAndNumbersAsOtherMapsHave)
+{
+    G_daemon_log_level = 2;
+    struct Row {
+        const char *node;
+        const char *message;
+    };
+    const Row rows[] = {
+        {"0/map/a\\/b/prio/10", "a map's name must not hold \"/\": choose another name"},
+        {"0/map/d1", "must hold the map's name, \"d1\""},
+        {"0/map/d1/prio/abc",
+         "an entry's priority is a decimal number from 1 to 65535, not \"abc\""},
+        {"0/map/d1/prio/0/x", "an entry's priority is a decimal number from 1 to 65535, not \"0\""},
+        {"0/map/d1/prio/10", "must hold the entry's priority, \"10\""},
+        {"1/map/d1", "DNS-proxy maps are those of VRF 0, not \"1\""},
+        {"1/map/d1/prio/10/x", "DNS-proxy maps are those of VRF 0, not \"1\""},
+        {"0/map/d1/a/b/c/d/e/f/g/h/i/j/k/l",
+         "too deep: a name in here has 17 parts at most, not 18"},
+    };
+    for (const auto &[node, message] : rows) {
+        const std::string name = std::string("/ov/dnsproxy/config/") + node;
+        set(name, "x");
+        EXPECT_THAT(commit_in_vain(), testing::StartsWith(name + ": " + message + " ("));
+    }
 }
 
 } // namespace

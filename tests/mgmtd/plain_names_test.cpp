@@ -15,6 +15,24 @@ TEST(PlainNames, AreOneTo255BytesLong)
               "a thing's name is 1 to 255 bytes long, not 0");
     EXPECT_EQ(plain_name_fault("a thing's name", std::string(256, 'a')),
               "a thing's name is 1 to 255 bytes long, not 256");
+    EXPECT_EQ(plain_name_fault("a thing's name", "abc", 3), std::nullopt);
+    EXPECT_EQ(plain_name_fault("a thing's name", "abcd", 3),
+              "a thing's name is 1 to 3 bytes long, not 4");
+}
+
+TEST(PlainNames, HoldNoControlCharacters)
+{
+    struct Row {
+        const char *name;
+        const char *shown;
+    };
+    for (const auto &[name, shown] :
+         {Row{"a\nb", "a\\nb"}, Row{"\r", "\\r"}, Row{"\x1b[2J", "\\x1b[2J"},
+          Row{"a\x7f", "a\\x7f"}, Row{"\xc2\x9b", "\\u009b"}}) {
+        EXPECT_EQ(plain_name_fault("a thing's name", name),
+                  "a thing's name must not hold control characters, as \"" + std::string(shown) +
+                      "\" does: choose another name");
+    }
 }
 
 TEST(PlainNames, HoldNothingThatMeansSomethingInPaths)

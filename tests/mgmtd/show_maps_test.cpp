@@ -44,8 +44,8 @@ TEST_F(ShowMaps, ListsTheEntriesOfAllKinds)
     set(rmap("m2"), "m2");
     set(matched(*find_map_kind("secmap"), "z1", "5", "acl"), "a1");
     set(matched(*find_map_kind("secmap"), "z1", "5", "matchstr"), "dst_port:80");
-    set("/ov/dnsproxy/config/0/map/d1/prio/7", bt_uint16, "7");
     ASSERT_EQ(commit(), "committed");
+    put_in_store("/ov/dnsproxy/config/0/map/d1/prio/7", bt_uint16, "7");
     EXPECT_EQ(ask({{"what", "maps"}}),
               R"({"maps":[{"entries":[{"acl":null,"matchstr":"any","priority":"9"},)"
               R"({"acl":"a1","matchstr":null,"priority":"10"}],"kind":"route-map","name":"m1"},)"
@@ -105,12 +105,46 @@ TEST_F(ShowMaps, ListsAndChecksReferences)
     EXPECT_EQ(ask(check), R"({"faults":[],"records":2})");
     erase(rmap("m1/prio/10/match/0/acl"));
     ASSERT_EQ(commit(), "committed");
-    EXPECT_EQ(ask(check),
-              R"({"faults":[{"acl":"a1","kind":"route-map","map":"m1",)"
-              R"("message":"there is a record, but the entry names no ACL","priority":"10"}],)"
-              R"("records":2})");
+    EXPECT_EQ(ask(check), R"({"faults":[],"records":1})");
     EXPECT_EQ(ask({{"command", "show"}, {"what", "references"}, {"check", "yes"}}),
               "bad-request: command \"show\": \"check\" must be true or false");
+}
+
+TEST_F(ShowMaps, SaysHowAStaleRecordIsMended)
+{
+    add_acl("a1");
+    add_entry("m1", "20", "a1");
+    ASSERT_EQ(commit(), "committed");
+    put_in_store(acl("a1/rmap/m1/prio/10"), bt_uint32, "10");
+    const json check = {{"what", "references"}, {"check", true}};
+    EXPECT_EQ(ask(check),
+              R"({"faults":[{"acl":"a1","kind":"route-map","map":"m1",)"
+              R"("message":"there is a record, but the entry names no ACL; delete )"
+              R"(/ov/tunneld/acl/config/a1/rmap/m1/prio/10","priority":"10"}],"records":2})");
+    erase(acl("a1/rmap/m1/prio/10"));
+    EXPECT_EQ(commit(), "committed");
+    EXPECT_EQ(ask(check), R"({"faults":[],"records":1})");
+}
+
+TEST_F(ShowMaps, SaysHowARecordThatIsMissingOrWrongIsMended)
+{
+    add_acl("a1");
+    add_entry("m1", "10", "a1");
+    add_entry("m1", "20", "a1");
+    ASSERT_EQ(commit(), "committed");
+    const std::string node = rmap("m1/prio/10/match/0/acl");
+    const json check = {{"what", "references"}, {"check", true}};
+    for (const std::optional<std::string> &value :
+         {std::optional<std::string>(), std::optional<std::string>("11")}) {
+        put_in_store(acl("a1/rmap/m1/prio/10"), bt_uint32, value);
+        EXPECT_THAT(ask(check),
+                    testing::HasSubstr("; delete " + node + ", commit, and set it again"));
+        erase(node);
+        EXPECT_EQ(commit(), "committed");
+        set(node, "a1");
+        EXPECT_EQ(commit(), "committed");
+        EXPECT_EQ(ask(check), R"({"faults":[],"records":2})");
+    }
 }
 
 } // namespace
