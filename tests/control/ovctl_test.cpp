@@ -588,6 +588,78 @@ TEST_F(OvctlTest, ShowReferencesFailsWhenACheckFindsSomething)
                        ""}));
 }
 
+TEST_F(OvctlTest, ShowInterfacesPrintsAnInterfacePerLine)
+{
+    answer_with(
+        {{"interfaces",
+          {{{"name", "eth0"},
+            {"kind", "interface"},
+            {"enabled", true},
+            {"users",
+             {{{"node", "/ov/wccpd/wccp/srv_grp/config/10/interface"}, {"text", "wccp group 10"}},
+              {{"node", "/ov/redd/net/interface/vrrp/config/v"}, {"text", "vrrp interface"}}}}},
+           {{"name", "tun0"}, {"kind", "tunnel"}, {"enabled", false}, {"users", json::array()}},
+           {{"name", "vlan7"},
+            {"kind", "vlan"},
+            {"enabled", nullptr},
+            {"users", json::array()}}}}});
+    EXPECT_EQ(ask({"show", "interfaces"}),
+              (Outcome{0,
+                       "NAME   KIND       ENABLED  USED BY\n"
+                       "eth0   interface  yes      wccp group 10, vrrp interface\n"
+                       "tun0   tunnel     no       -\n"
+                       "vlan7  vlan       -        -\n",
+                       ""}));
+    EXPECT_EQ(request(), (json{{"command", "show"}, {"what", "interfaces"}}));
+    answer_with({{"interfaces", json::array()}});
+    EXPECT_EQ(ask({"show", "interfaces"}), (Outcome{0, "no interfaces\n", ""}));
+}
+
+TEST_F(OvctlTest, ShowBudgetPrintsTheFigures)
+{
+    answer_with({{"configured", 3},
+                 {"allowed", 16},
+                 {"in_kernel", 5},
+                 {"index_budget", 128},
+                 {"each_takes", 2},
+                 {"left", 13}});
+    EXPECT_EQ(ask({"show", "budget"}), (Outcome{0,
+                                                "configured          3\n"
+                                                "model's limit       16\n"
+                                                "in the kernel       5\n"
+                                                "index budget        128\n"
+                                                "each takes          2\n"
+                                                "left                13\n",
+                                                ""}));
+    EXPECT_EQ(request(), (json{{"command", "show"}, {"what", "budget"}}));
+}
+
+TEST_F(OvctlTest, EnableAndDisableSendTheInterface)
+{
+    answer_with(json::object());
+    EXPECT_EQ(ask({"enable", "eth0"}), (Outcome{0, "", ""}));
+    EXPECT_EQ(request(), (json{{"command", "enable"}, {"name", "eth0"}, {"enabled", true}}));
+    EXPECT_EQ(ask({"disable", "eth0"}), (Outcome{0, "", ""}));
+    EXPECT_EQ(request(), (json{{"command", "enable"}, {"name", "eth0"}, {"enabled", false}}));
+}
+
+TEST_F(OvctlTest, ClearSaysHowManyChildrenAreGone)
+{
+    answer_with({{"removed", 1}});
+    EXPECT_EQ(ask({"clear", "/a"}), (Outcome{0, "removed 1 child\n", ""}));
+    EXPECT_EQ(request(), (json{{"command", "clear"}, {"name", "/a"}}));
+    answer_with({{"removed", 12}});
+    EXPECT_EQ(ask({"clear", "/a"}), (Outcome{0, "removed 12 children\n", ""}));
+}
+
+TEST_F(OvctlTest, AlarmSendsItsText)
+{
+    answer_with(json::object());
+    EXPECT_EQ(ask({"alarm", "restart the appliance"}), (Outcome{0, "", ""}));
+    EXPECT_EQ(request(), (json{{"command", "alarm"}, {"text", "restart the appliance"}}));
+    EXPECT_EQ(ask({"alarm"}).exit, 2);
+}
+
 TEST_F(OvctlTest, ARefusalOfSeveralLinesKeepsThem)
 {
     refuse_with({"refused",
