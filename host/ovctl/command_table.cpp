@@ -51,8 +51,8 @@ constexpr ArgumentSpec alarm_arguments[] = {
 
 constexpr ArgumentSpec load_arguments[] = {
     {positional, "file",
-     "A file of lines NAME,TYPE,VALUE to set, -NAME to remove, and # comments; - is standard "
-     "input"},
+     "A file of lines NAME,TYPE,VALUE to set, -NAME to remove, and # comments; a value cannot hold "
+     "a comma; - is standard input"},
 };
 
 constexpr ArgumentSpec upgrade_arguments[] = {

@@ -62,6 +62,8 @@ std::uint32_t checked_number(const std::string &text, const std::string &what)
 
 std::string read_text(const std::string &file)
 {
+    if (file.empty())
+        throw UsageError("the name of the file is empty; - is standard input");
     const bool standard_input = file == "-";
     const std::string what = standard_input ? "standard input" : file;
     UniqueFd opened;

@@ -47,6 +47,16 @@ TEST(TextInputTest, FormsThatStandForNothingAreRefused)
         EXPECT_NE(fault_of(text), "none") << text;
 }
 
+TEST(TextInputTest, AFileHasAName)
+{
+    try {
+        static_cast<void>(read_text(""));
+        ADD_FAILURE();
+    } catch (const UsageError &error) {
+        EXPECT_STREQ(error.what(), "the name of the file is empty; - is standard input");
+    }
+}
+
 TEST(TextInputTest, ANumberIsWholeAndFits)
 {
     EXPECT_EQ(checked_number("0", "N"), 0U);
