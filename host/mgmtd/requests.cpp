@@ -277,8 +277,8 @@ json Requests::upgrade(const json &request, const ClientInfo &client)
     }
     if (result.converted + result.by_acl == 0) {
         throw RequestError(error_code::refused,
-                           source + " has no map entries to convert; nothing was stored (use load "
-                                    "for a file of other nodes)");
+                           "there are no map entries to convert; nothing was stored (use load for "
+                           "a file of other nodes)");
     }
     CommitNote note = client_note(request, client);
     if (note.comment.empty()) {

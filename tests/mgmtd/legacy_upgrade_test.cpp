@@ -511,7 +511,7 @@ TEST_F(UpgradeRequest, NeedsAText)
 TEST_F(UpgradeRequest, NeedsEntries)
 {
     for (const std::string text : {"", "# nothing\n", "/a,string,x\n", "-/ov/x\n"}) {
-        EXPECT_EQ(refusal(text), "refused: legacy.db has no map entries to convert; nothing was "
+        EXPECT_EQ(refusal(text), "refused: there are no map entries to convert; nothing was "
                                  "stored (use load for a file of other nodes)");
     }
     expect_nothing_happened();
