@@ -60,7 +60,7 @@ std::size_t set_depth(const MapKind &kind)
 std::string joined(std::string node, Parts parts)
 {
     for (const std::string &part : parts) {
-        node += "/" + escape_component(part);
+        node.append("/").append(escape_component(part));
     }
     return node;
 }
