@@ -87,7 +87,8 @@ TEST(BashCompletion, OffersEveryOptionOfACommandAndTheOnesOfAll)
 
 TEST(BashCompletion, OffersWhatBeginsAsTyped)
 {
-    EXPECT_THAT(offered_by_bash({"ovctl", "di"}), ElementsAre("diff", "discard"));
+    EXPECT_THAT(offered_by_bash({"ovctl", "di"}),
+                ElementsAre("diff", "disable", "discard"));
     EXPECT_THAT(offered_by_bash({"ovctl", "show", "tunnel-"}), ElementsAre("tunnel-tables"));
     EXPECT_THAT(offered_by_bash({"ovctl", "fly"}), IsEmpty());
     EXPECT_THAT(offered_by_bash({"ovctl", "show", "mode", ""}), IsEmpty());
@@ -96,7 +97,7 @@ TEST(BashCompletion, OffersWhatBeginsAsTyped)
 TEST(BashCompletion, PassesOverOptionsAndTheirValues)
 {
     EXPECT_THAT(offered_by_bash({"ovctl", "--json", "--socket", "load", "di"}),
-                ElementsAre("diff", "discard"));
+                ElementsAre("diff", "disable", "discard"));
     EXPECT_THAT(offered_by_bash({"ovctl", "--socket", "=", "/s", "show", "--timeout", "5", "ma"}),
                 ElementsAre("maps"));
     EXPECT_THAT(offered_by_bash({"ovctl", "commit", "--comment", ""}), IsEmpty());
