@@ -87,8 +87,7 @@ TEST(BashCompletion, OffersEveryOptionOfACommandAndTheOnesOfAll)
 
 TEST(BashCompletion, OffersWhatBeginsAsTyped)
 {
-    EXPECT_THAT(offered_by_bash({"ovctl", "di"}),
-                ElementsAre("diff", "disable", "discard"));
+    EXPECT_THAT(offered_by_bash({"ovctl", "di"}), ElementsAre("diff", "disable", "discard"));
     EXPECT_THAT(offered_by_bash({"ovctl", "show", "tunnel-"}), ElementsAre("tunnel-tables"));
     EXPECT_THAT(offered_by_bash({"ovctl", "fly"}), IsEmpty());
     EXPECT_THAT(offered_by_bash({"ovctl", "show", "mode", ""}), IsEmpty());
