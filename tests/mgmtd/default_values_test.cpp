@@ -235,10 +235,10 @@ TEST_F(DefaultValues, LeaveOutLinesWithNulBytesAndNamesThatAreNotUtf8)
         warnings_,
         ElementsAre(at + "2: the line holds a NUL byte; left out",
                     at + "3: the line holds a NUL byte; left out",
-                    at + "4: /x/\xff: the node's name is not UTF-8: convert the file first; left "
+                    at + "4: /x/\\xff: the node's name is not UTF-8: convert the file first; left "
                          "out",
                     at + "5: the line holds a NUL byte; left out",
-                    at + "7: /x/\xff: the node's name is not UTF-8: convert the file first; left "
+                    at + "7: /x/\\xff: the node's name is not UTF-8: convert the file first; left "
                          "out"));
     EXPECT_THAT(summaries_, Contains("debugging defaults 3/0"));
 }
