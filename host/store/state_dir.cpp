@@ -56,12 +56,20 @@ bool holds_only_state(const std::filesystem::path &dir)
     return !fault;
 }
 
-// The files are their user's alone, but who may write the directory can put others in their place.
+// The files are their user's alone, but who owns or may write the directory can put others in their
+// place.
 void close_to_others(const std::filesystem::path &dir)
 {
     struct stat about {
     };
-    if (::stat(dir.c_str(), &about) != 0 || (about.st_mode & 077U) == 0)
+    if (::stat(dir.c_str(), &about) != 0)
+        return;
+    if (about.st_uid != ::geteuid() && about.st_uid != 0) {
+        throw StoreError("the state directory " + dir.string() + " belongs to another user (uid " +
+                         std::to_string(about.st_uid) +
+                         "); make it this user's, or choose another state directory");
+    }
+    if ((about.st_mode & 077U) == 0)
         return;
     if (holds_only_state(dir) && ::chmod(dir.c_str(), 0700) == 0)
         return;

@@ -1,6 +1,7 @@
 #include "host/store/state_dir.h"
 
 #include <gtest/gtest.h>
+#include <sched.h>
 #include <sys/stat.h>
 #include <unistd.h>
 
@@ -182,6 +183,21 @@ TEST(StateDir, OneThatCannotBeWrittenIsRefused)
               "the state directory " + dir +
                   " cannot be written: Permission denied; give this user write permission, or"
                   " choose another state directory");
+}
+
+TEST(StateDir, OneOfAnotherUserIsRefused)
+{
+    EXPECT_EQ(in_child([] {
+                  ovtest::become_unprivileged();
+                  const std::string user = std::to_string(::geteuid());
+                  // In there the owner of the folder is somebody else than this user and root.
+                  if (::unshare(CLONE_NEWUSER) != 0)
+                      return std::string("no user namespace");
+                  ovtest::write_file("/proc/self/uid_map", "0 " + user + " 1");
+                  return lock_refusal("/var/tmp");
+              }),
+              "the state directory /var/tmp belongs to another user (uid 65534); make it this"
+              " user's, or choose another state directory");
 }
 
 TEST(StateDir, OneThatCannotBeMadeIsRefused)
