@@ -48,6 +48,17 @@ try {
     return std::nullopt;
 }
 
+/// False when a signal came first.
+bool is_answered(ControlClient &client, const Command &command, const json &arguments)
+try {
+    (void)client.call(command.request, arguments);
+    return true;
+} catch (const ClientError &) {
+    if (!client.is_woken())
+        throw;
+    return false;
+}
+
 bool print(const std::string &text, int stop_fd)
 {
     try {
@@ -59,11 +70,13 @@ bool print(const std::string &text, int stop_fd)
 
 } // namespace
 
-ExitCode follow_events(ControlClient &client, const Command &command, bool as_json,
-                       std::ostream &out)
+ExitCode follow_events(ControlClient &client, const Command &command, const json &arguments,
+                       bool as_json, std::ostream &out)
 {
     const SignalPipe stop;
     client.wake_on(stop.fd());
+    if (!is_answered(client, command, arguments))
+        return ExitCode::ok;
     while (const std::optional<json> event = next_event(client))
         if (!print(text_of_event(*event, command, as_json, out), stop.fd()))
             break;

@@ -77,9 +77,9 @@ ExitCode ask_and_print(const Invocation &invocation, std::ostream &out, std::ost
     const std::chrono::duration<double> patience(invocation.options.timeout_seconds);
     ControlClient client(invocation.options.socket,
                          std::chrono::ceil<std::chrono::milliseconds>(patience));
-    const json result = call_mgmtd(client, invocation, arguments, err);
     if (command.follows)
-        return follow_events(client, command, invocation.options.json, out);
+        return follow_events(client, command, arguments, invocation.options.json, out);
+    const json result = call_mgmtd(client, invocation, arguments, err);
     if (invocation.options.json)
         out << to_line({{"ok", true}, {"result", result}});
     else
