@@ -78,17 +78,6 @@ std::optional<std::string> route_fault(const std::vector<std::string> &parts)
     return std::nullopt;
 }
 
-void erase(const md_dbinfo *dbinfo, const std::string &node)
-{
-    // The checks of a commit may write the database that it proposes.
-    auto *const newdb = const_cast<mdb_db *>(dbinfo->newdb);
-    const int err = mdb_set_node_str(dbinfo->commit, newdb, bsso_delete, 0, bt_string, nullptr,
-                                     "%s", node.c_str());
-    if (err != 0) {
-        throw std::runtime_error("cannot remove " + node + ": error code " + std::to_string(err));
-    }
-}
-
 std::string next_hops_node(const std::string &prefix)
 {
     return prefix_node(prefix) + "/nhop";
@@ -114,10 +103,10 @@ void remove_what_is_left(const md_dbinfo *dbinfo, const Subnet &subnet)
     for (const std::string &prefix : child_names(dbinfo->newdb, prefixes_node)) {
         const std::vector<std::string> hops = next_hops_of(dbinfo->newdb, prefix, subnet);
         for (const std::string &hop : hops) {
-            erase(dbinfo, hop);
+            propose_removal(dbinfo, hop);
         }
         if (!hops.empty() && child_names(dbinfo->newdb, next_hops_node(prefix)).empty()) {
-            erase(dbinfo, prefix_node(prefix));
+            propose_removal(dbinfo, prefix_node(prefix));
         }
     }
 }
