@@ -220,6 +220,7 @@ int md_set_if_enable(mdb_db *db, const char *ifname, tbool is_enabled)
     owned_binding enable;
     BAIL_ERROR(bn_binding_new_str(enable.out(), node, ba_value, bt_bool, 0,
                                   is_enabled ? "true" : "false"));
+    BAIL_NULL(enable.get());
     BAIL_ERROR(mdb_set_node_binding(nullptr, db, bsso_modify, 0, enable.get()));
     return 0;
 }

@@ -21,16 +21,14 @@ constexpr char bonding_node[] = "/ov/tunneld/system/config/bonding";
 
 constexpr char default_submode[] = "normal";
 
-// Reads a string node; without a node `ret_present` is false, without text `ret_text` stays null.
-int read_text(const mdb_db *db, const char *node, owned_text &ret_text, bool &ret_present)
+// Reads a string node; without a node `ret_binding` stays null, without text `ret_text` does.
+int read_text(const mdb_db *db, const char *node, owned_binding &ret_binding, owned_text &ret_text)
 {
-    owned_binding binding;
-    const int err = mdb_get_node_binding(nullptr, db, node, 0, binding.out());
-    ret_present = binding.get() != nullptr;
-    if (err != 0 || !ret_present) {
+    const int err = mdb_get_node_binding(nullptr, db, node, 0, ret_binding.out());
+    if (err != 0 || ret_binding.get() == nullptr) {
         return err;
     }
-    return bn_binding_get_str(binding.get(), ba_value, bt_string, 0, ret_text.out());
+    return bn_binding_get_str(ret_binding.get(), ba_value, bt_string, 0, ret_text.out());
 }
 
 // A flag node on behalf of a yes/no question, which the error lines name; absent means false.
@@ -74,9 +72,9 @@ int md_get_db_system_mode(const mdb_db *db, char **ret_str_value)
     BAIL_NULL(db);
 
     owned_text mode;
-    bool present = false;
-    BAIL_ERROR(read_text(db, mode_node, mode, present));
-    if (!present) {
+    owned_binding binding;
+    BAIL_ERROR(read_text(db, mode_node, binding, mode));
+    if (binding.get() == nullptr) {
         return 0;
     }
     BAIL_NULL(mode.get());
@@ -92,8 +90,8 @@ int md_get_db_bridge_submode(const mdb_db *db, char **ret_str_value)
     BAIL_NULL(db);
 
     owned_text submode;
-    bool present = false;
-    BAIL_ERROR(read_text(db, submode_node, submode, present));
+    owned_binding binding;
+    BAIL_ERROR(read_text(db, submode_node, binding, submode));
     *ret_str_value = strdup(submode.get() != nullptr ? submode.get() : default_submode);
     BAIL_NULL(*ret_str_value);
     return 0;

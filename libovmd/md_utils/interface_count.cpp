@@ -38,8 +38,9 @@ uint32 max_interfaces()
 
 bool adds_interface(const mdb_db_change *change, const char *bpattern)
 {
-    return change != nullptr && change->mdc_change_type == mdct_add &&
-           bn_binding_name_pattern_match(ts_str(change->mdc_name), bpattern);
+    return change != nullptr &&
+           bn_binding_name_pattern_match(ts_str(change->mdc_name), bpattern) &&
+           change->mdc_change_type == mdct_add;
 }
 
 } // namespace
@@ -48,10 +49,13 @@ tbool md_ifmgr_can_interface_be_added(mdb_db_change_array *changes, const char *
                                       int multiplier)
 {
     BAIL_NULL_ANSWER(changes, false);
-    BAIL_NULL_ANSWER(bpattern, false);
 
-    uint32 count = 0;
     const int32 num_changes = mdb_db_change_array_length_quick(changes);
+    if (num_changes < 1) {
+        return true;
+    }
+    BAIL_NULL_ANSWER(bpattern, false);
+    uint32 count = 0;
     for (int32 i = 0; i < num_changes; ++i) {
         const mdb_db_change *const change =
             mdb_db_change_array_get_quick(changes, static_cast<uint32>(i));

@@ -554,6 +554,9 @@ TEST_F(Admission, OfNullIsRefused)
 {
     EXPECT_FALSE(in_library(md_ifmgr_can_interface_be_added, nullptr, vlan_pattern, 1));
     ChangeList changes;
+    EXPECT_TRUE(in_library(md_ifmgr_can_interface_be_added, changes.get(), nullptr, 1))
+        << "no change is compared with it";
+    changes.add(mdct_modify, std::string(vlan_root) + "a");
     EXPECT_FALSE(in_library(md_ifmgr_can_interface_be_added, changes.get(), nullptr, 1));
     const std::string line = error_line("md_utils", admission, "Unexpected NULL");
     EXPECT_THAT(log_lines(), ElementsAre(line, line));
