@@ -12,6 +12,9 @@
 namespace ovhost
 {
 
+/// Seconds that a commit can wait for its confirmation: a day.
+inline constexpr std::uint32_t longest_confirmation = 86400;
+
 [[nodiscard]] std::string required_text(const nlohmann::json &request, const char *name);
 [[nodiscard]] std::string optional_text(const nlohmann::json &request, const char *name,
                                         const std::string &otherwise = {});

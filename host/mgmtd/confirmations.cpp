@@ -4,6 +4,7 @@
 #include "host/commit/past.h"
 #include "host/framework/log_config.h"
 #include "host/mgmtd/rollback_target.h"
+#include "host/support/commit_range.h"
 
 #include <algorithm>
 #include <exception>
@@ -19,12 +20,9 @@ void log_line(int level, const std::string &text)
     log_host_line(level, "mgmtd", text);
 }
 
-std::string commits_text(const Wait &wait)
+std::string commits_of(const Wait &wait)
 {
-    const std::string last = std::to_string(wait.number);
-    return wait.back_to + 1 == wait.number
-               ? "commit " + last
-               : "commits " + std::to_string(wait.back_to + 1) + " to " + last;
+    return commit_range(wait.back_to, wait.number);
 }
 
 /// All that a failed commit says, in one line.
@@ -88,16 +86,16 @@ void Confirmations::take_up()
     const std::int64_t left =
         std::clamp<std::int64_t>(wait_->deadline - commit_time(), 0, wait_->seconds);
     due_ = Clock::now() + std::chrono::seconds(left);
-    log_line(ov_log_notice, commits_text(*wait_) + " will be undone in " + std::to_string(left) +
+    log_line(ov_log_notice, commits_of(*wait_) + " will be undone in " + std::to_string(left) +
                                 " s unless confirmed");
 }
 
 CommitReport Confirmations::commit(Candidate &candidate, const CommitNote &note)
 {
     CommitReport report = engine_.commit(candidate, note);
-    if (report.outcome == CommitOutcome::unchanged && !note.confirm_within) {
+    if (report.outcome == CommitOutcome::unchanged) {
         try {
-            (void)confirm();
+            settle_unchanged(note);
         } catch (const StoreError &error) {
             report = not_stored(error);
         }
@@ -106,16 +104,30 @@ CommitReport Confirmations::commit(Candidate &candidate, const CommitNote &note)
     return report;
 }
 
+/// What the store does to the wait with a commit, for one that it does not see.
+void Confirmations::settle_unchanged(const CommitNote &note)
+{
+    if (!store_.wait()) {
+        return;
+    }
+    if (note.confirm_within) {
+        store_.prolong_wait(note.time, *note.confirm_within);
+    } else if (note.undoes_wait) {
+        store_.end_wait(Confirmation::undone);
+    } else {
+        (void)confirm();
+    }
+}
+
 bool Confirmations::confirm()
 {
     if (!store_.wait()) {
         return false;
     }
     const Wait wait = *store_.wait();
-    store_.confirm();
+    store_.end_wait(Confirmation::confirmed);
     follow();
-    log_line(ov_log_notice, commits_text(wait) +
-                                (wait.back_to + 1 == wait.number ? " is" : " are") + " confirmed");
+    log_line(ov_log_notice, commit_range(wait.back_to, wait.number, "is", "are") + " confirmed");
     return true;
 }
 
@@ -142,8 +154,7 @@ bool Confirmations::undo_if_due()
     for (const Warning &warning : report.warnings) {
         log_line(ov_log_warning, warning.message);
     }
-    log_line(ov_log_warning, commits_text(wait) +
-                                 (wait.back_to + 1 == wait.number ? " was" : " were") +
+    log_line(ov_log_warning, commit_range(wait.back_to, wait.number, "was", "were") +
                                  " not confirmed in time: the configuration is again as after "
                                  "commit " +
                                  std::to_string(wait.back_to));
@@ -156,7 +167,7 @@ CommitReport Confirmations::undo(const Wait &wait)
         Candidate candidate(engine_.running());
         candidate.replace(rollback_target(
             configuration_after(store_, engine_.running(), wait.back_to), engine_.running()));
-        CommitNote note = daemon_note("undo of " + commits_text(wait) + ", not confirmed in time");
+        CommitNote note = daemon_note("undo of " + commits_of(wait) + ", not confirmed in time");
         note.rollback_to = wait.back_to;
         note.undoes_wait = true;
         return commit(candidate, note);
@@ -173,7 +184,7 @@ void Confirmations::put_off(const Wait &wait, const std::string &why)
         return;
     }
     refusal_ = why;
-    log_line(ov_log_error, commits_text(wait) + " cannot be undone: " + why +
+    log_line(ov_log_error, commits_of(wait) + " cannot be undone: " + why +
                                "; trying again every " + std::to_string(retry_interval.count()) +
                                " s until it can be, or is confirmed, or there is another commit");
     try {

@@ -30,7 +30,7 @@ class Confirmations
     void take_up();
 
     /// A commit of the engine. When it is accepted and does not wait itself, those before it need
-    /// not wait any more, even if it changes nothing.
+    /// not wait any more, even if it changes nothing; when it does wait, they wait as long as it.
     [[nodiscard]] CommitReport commit(Candidate &candidate, const CommitNote &note);
 
     /// Confirms what waits; false when nothing does. Throws StoreError.
@@ -51,6 +51,7 @@ class Confirmations
     /// Sets the deadline anew when the store's wait is another one.
     void follow();
     [[nodiscard]] CommitReport undo(const Wait &wait);
+    void settle_unchanged(const CommitNote &note);
     void put_off(const Wait &wait, const std::string &why);
 
     Store &store_;

@@ -20,7 +20,6 @@ namespace
 using nlohmann::json;
 
 constexpr std::uint32_t default_limit = 20;
-constexpr std::uint32_t longest_wait = 86400;
 
 // In the order of the enumeration.
 constexpr std::array confirmation_words{"none", "waiting", "confirmed", "undone"};
@@ -52,6 +51,11 @@ json commit_json(const RecordedCommit &commit)
             {"confirmation", confirmation_json(commit)}};
 }
 
+json confirmed_json(const Wait &waited)
+{
+    return {{"number", waited.number}, {"back_to", waited.back_to}};
+}
+
 std::uint32_t required_number(const json &request, const char *name)
 {
     const std::optional<std::uint32_t> number = optional_number(request, name);
@@ -64,7 +68,7 @@ std::uint32_t required_number(const json &request, const char *name)
 [[noreturn]] void throw_unknown(std::uint64_t number, std::uint64_t first, std::uint64_t last)
 {
     const std::string held = first == 0      ? "it is empty"
-                             : first == last ? "it goes back to commit " + std::to_string(last)
+                             : first == last ? "it holds only commit " + std::to_string(last)
                                              : "it goes from commit " + std::to_string(first) +
                                                    " to commit " + std::to_string(last);
     throw RequestError(error_code::not_found,
@@ -104,7 +108,7 @@ std::string comment_of(const json &request)
     constexpr std::size_t longest = 4096;
     std::string comment = optional_text(request, "comment");
     if (comment.size() > longest || comment.find('\0') != std::string::npos) {
-        throw RequestError(error_code::bad_value, "\"comment\" must have at most " +
+        throw RequestError(error_code::bad_value, "a comment has at most " +
                                                       std::to_string(longest) +
                                                       " bytes and no NUL character");
     }
@@ -145,9 +149,11 @@ CommitNote client_note(const json &request, const ClientInfo &client)
     note.author = client.user;
     note.comment = comment_of(request);
     note.confirm_within = optional_number(request, "confirm");
-    if (note.confirm_within && (*note.confirm_within == 0 || *note.confirm_within > longest_wait)) {
+    if (note.confirm_within &&
+        (*note.confirm_within == 0 || *note.confirm_within > longest_confirmation)) {
         throw RequestError(error_code::bad_value, "\"confirm\" must be from 1 to " +
-                                                      std::to_string(longest_wait) + " seconds");
+                                                      std::to_string(longest_confirmation) +
+                                                      " seconds");
     }
     return note;
 }
@@ -177,7 +183,7 @@ json commit_answer(const Configuration &configuration, const CommitReport &repor
     if (configuration.store().wait()) {
         answer["waits"] = wait_json(configuration);
     } else if (waited) {
-        answer["confirmed"] = waited->number;
+        answer["confirmed"] = confirmed_json(*waited);
     }
     return answer;
 }
@@ -185,6 +191,9 @@ json commit_answer(const Configuration &configuration, const CommitReport &repor
 json answer_history(const Configuration &configuration, const json &request)
 {
     const std::uint32_t limit = optional_number(request, "limit").value_or(default_limit);
+    if (limit == 0) {
+        throw RequestError(error_code::bad_value, "\"limit\" must be 1 at least");
+    }
     auto commits = json::array();
     for (const RecordedCommit &commit : configuration.store().history(limit)) {
         commits.push_back(commit_json(commit));
@@ -231,7 +240,7 @@ json answer_confirm(Configuration &configuration)
         throw RequestError(error_code::not_found, "no commit waits to be confirmed");
     }
     configuration.confirm();
-    return {{"confirmed", waited->number}};
+    return {{"confirmed", confirmed_json(*waited)}};
 }
 
 } // namespace ovhost

@@ -13,6 +13,15 @@ namespace ovhost
 namespace
 {
 
+constexpr const char *footer = "Runs in the foreground and logs to standard error until a signal "
+                               "ends it.\n\n"
+                               "Exit codes:\n"
+                               "  0  ended by SIGTERM or SIGINT\n"
+                               "  1  could not start; standard error says why\n"
+                               "  2  the command line is wrong\n\n"
+                               "Example:\n"
+                               "  mgmtd --model branch-100 --group netadmin";
+
 /// A log level by its word or number. Those graver than an error are not offered: nothing logs at
 /// them, and a daemon that does not even tell its errors is of no use.
 std::string level_fault(const std::string &text)
@@ -46,6 +55,7 @@ std::optional<DaemonOptions> parse_options(int argc, char **argv, int &ret_exit_
     DaemonOptions options;
     CLI::App app("The management daemon: keeps the configuration, checks and applies commits.",
                  "mgmtd");
+    app.footer(footer);
     app.set_version_flag("--version", program_version());
     app.add_option("--state-dir", options.state_dir, "Folder of the durable configuration")
         ->check(not_empty())

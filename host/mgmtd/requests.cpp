@@ -186,7 +186,7 @@ json Requests::discard(const json &, const ClientInfo &)
 
 json Requests::diff(const json &request, const ClientInfo &)
 {
-    if (request.contains("after")) {
+    if (request.contains("after") || request.contains("to")) {
         return answer_past_diff(configuration_, request);
     }
     return {
@@ -284,12 +284,13 @@ json Requests::upgrade(const json &request, const ClientInfo &client)
     if (note.comment.empty()) {
         note.comment = "upgrade from " + source;
     }
+    const std::optional<Wait> waited = configuration_.store().wait();
     const CommitReport report = store_candidate(note, "the upgraded configuration is refused");
-    return {{"converted", result.converted},
-            {"by_acl", result.by_acl},
-            {"number", configuration_.commit_number()},
-            {"changes", changes_json(report.changes)},
-            {"warnings", warnings_json(report.warnings)}};
+    json answer = commit_answer(configuration_, report, waited);
+    answer["changes"] = changes_json(report.changes);
+    answer["converted"] = result.converted;
+    answer["by_acl"] = result.by_acl;
+    return answer;
 }
 
 json Requests::status(const json &, const ClientInfo &)

@@ -1,5 +1,6 @@
 #include "host/ovctl/command_table.h"
 
+#include "host/control/arguments.h"
 #include "host/ovctl/render.h"
 #include "host/ovctl/render_history.h"
 #include "host/ovctl/render_interfaces.h"
@@ -59,11 +60,15 @@ constexpr ArgumentSpec upgrade_arguments[] = {
     {positional, "file",
      "A file of lines NAME,TYPE,VALUE in which the entries of maps have a node for each field; it "
      "is only read; - is standard input"},
+    {text, "comment", "A remark for the history and for mgmtd's log"},
+    {number, "confirm",
+     "Undo the upgrade after so many seconds (1 to 86400) unless it is confirmed"},
 };
 
 constexpr ArgumentSpec commit_arguments[] = {
     {text, "comment", "A remark for the history and for mgmtd's log"},
-    {number, "confirm", "Undo the commit after so many seconds unless it is confirmed"},
+    {number, "confirm",
+     "Undo the commit after so many seconds (1 to 86400) unless it is confirmed"},
 };
 
 constexpr ArgumentSpec diff_arguments[] = {
@@ -82,7 +87,8 @@ constexpr ArgumentSpec show_commit_arguments[] = {
 constexpr ArgumentSpec rollback_arguments[] = {
     {positional, "number", "The number of a commit in the history"},
     {text, "comment", "A remark for the history and for mgmtd's log"},
-    {number, "confirm", "Undo the rollback after so many seconds unless it is confirmed"},
+    {number, "confirm",
+     "Undo the rollback after so many seconds (1 to 86400) unless it is confirmed"},
 };
 
 constexpr ArgumentSpec tunnel_arguments[] = {
@@ -151,7 +157,15 @@ json commit_request(const Arguments &arguments)
     if (const auto comment = arguments.find("comment"); comment != arguments.end())
         request["comment"] = checked_utf8(comment->second, "the comment");
     if (const auto confirm = arguments.find("confirm"); confirm != arguments.end())
-        request["confirm"] = checked_number(confirm->second, "--confirm");
+        request["confirm"] =
+            checked_number(confirm->second, "--confirm", {1, longest_confirmation});
+    return request;
+}
+
+json upgrade_request(const Arguments &arguments)
+{
+    json request = load_request(arguments);
+    request.update(commit_request(arguments));
     return request;
 }
 
@@ -177,7 +191,7 @@ json history_request(const Arguments &arguments)
     const auto limit = arguments.find("limit");
     if (limit == arguments.end())
         return json::object();
-    return {{"limit", checked_number(limit->second, "--limit")}};
+    return {{"limit", checked_number(limit->second, "--limit", {.first = 1})}};
 }
 
 json show_commit_request(const Arguments &arguments)
@@ -291,7 +305,7 @@ constexpr Command table[] = {
     {"upgrade",
      "Convert a legacy configuration, show what changes, and commit it if all of it could be "
      "converted",
-     "ovctl upgrade legacy.db", upgrade_arguments, "upgrade", load_request, render_upgrade,
+     "ovctl upgrade legacy.db", upgrade_arguments, "upgrade", upgrade_request, render_upgrade,
      "the file"},
     {"watch",
      "Print each commit as it is stored, until interrupted; with --json one event a line",

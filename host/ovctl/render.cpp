@@ -135,6 +135,7 @@ void render_upgrade(const json &result, std::ostream &out)
     out << counted(count_of(result, "converted"), "entry", "entries")
         << " converted to match strings, " << count_of(result, "by_acl") << " by ACL as before\n";
     print_commit(result, static_cast<long>(result.at("changes").size()), out);
+    render_wait(result, out);
 }
 
 void render_discard(const json &result, std::ostream &out)

@@ -3,6 +3,7 @@
 #include "host/ovctl/render.h"
 #include "host/ovctl/render_parts.h"
 #include "host/ovctl/terminal.h"
+#include "host/support/commit_range.h"
 
 #include <nlohmann/json.hpp>
 
@@ -63,10 +64,19 @@ std::string author_of(const json &commit)
     return author.at("uid").is_null() ? user : user + " (uid " + number_of(author, "uid") + ")";
 }
 
+/// Those that waited together, with the verb.
+std::string commits_of(const json &wait, const char *one, const char *several)
+{
+    const auto number = [&wait](const char *member) {
+        return static_cast<std::uint64_t>(count_of(wait, member));
+    };
+    return commit_range(number("back_to"), number("number"), one, several);
+}
+
 void print_refusal(const json &object, std::ostream &out)
 {
     if (!object.at("undo_refusal").is_null())
-        out << "the last try to undo was refused: " << text_of(object, "undo_refusal") << '\n';
+        out << "the last try to undo failed: " << text_of(object, "undo_refusal") << '\n';
 }
 
 void print_stored_commit(const json &event, std::ostream &out)
@@ -101,11 +111,11 @@ void render_event(const json &event, std::ostream &out)
 void render_wait(const json &result, std::ostream &out)
 {
     if (const auto confirmed = result.find("confirmed"); confirmed != result.end())
-        out << "commit " << number_of(result, "confirmed") << " is confirmed\n";
+        out << commits_of(*confirmed, "is", "are") << " confirmed\n";
     const auto waits = result.find("waits");
     if (waits == result.end() || waits->is_null())
         return;
-    out << "commit " << number_of(*waits, "number") << " is undone in "
+    out << commits_of(*waits, "is", "are") << " undone in "
         << counted(count_of(*waits, "seconds_left"), "second", "seconds")
         << " unless confirmed: run ovctl confirm\n";
     print_refusal(*waits, out);

@@ -50,13 +50,16 @@ std::string checked_utf8(std::string text, const std::string &what)
     throw UsageError(what + " is not UTF-8 in line " + std::to_string(line) + ": convert it first");
 }
 
-std::uint32_t checked_number(const std::string &text, const std::string &what)
+std::uint32_t checked_number(const std::string &text, const std::string &what,
+                             const NumberRange &range)
 {
     std::uint32_t number = 0;
     const char *const text_end = text.data() + text.size();
     const auto [end, fault] = std::from_chars(text.data(), text_end, number);
-    if (fault != std::errc() || end != text_end)
-        throw UsageError(what + " must be a whole number from 0 to 4294967295");
+    const bool is_number = fault == std::errc() && end == text_end;
+    if (!is_number || number < range.first || number > range.last)
+        throw UsageError(what + " must be a whole number from " + std::to_string(range.first) +
+                         " to " + std::to_string(range.last));
     return number;
 }
 

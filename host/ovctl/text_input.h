@@ -2,6 +2,7 @@
 // Texts from the command line and from files, checked before they are sent.
 
 #include <cstdint>
+#include <limits>
 #include <stdexcept>
 #include <string>
 
@@ -23,7 +24,14 @@ class UsageError : public std::runtime_error
 /// end up in the configuration. Throws UsageError that names `what` and the line.
 [[nodiscard]] std::string checked_utf8(std::string text, const std::string &what);
 
-/// A whole number from 0 to 4294967295. Throws UsageError that names `what`.
-[[nodiscard]] std::uint32_t checked_number(const std::string &text, const std::string &what);
+/// The bounds of a number, both of them in it.
+struct NumberRange {
+    std::uint32_t first = 0;
+    std::uint32_t last = std::numeric_limits<std::uint32_t>::max();
+};
+
+/// A whole number of the range. Throws UsageError that names `what` and the range.
+[[nodiscard]] std::uint32_t checked_number(const std::string &text, const std::string &what,
+                                           const NumberRange &range = {});
 
 } // namespace ovhost

@@ -33,7 +33,7 @@ enum class Confirmation {
     none,      // was in force for good at once
     waiting,   // is going to be undone
     confirmed, // was confirmed, by a request or by a later commit
-    undone     // was undone by a later commit
+    undone     // was undone by a later commit, or by none when nothing was left to undo
 };
 
 struct RecordedCommit {

@@ -166,7 +166,7 @@ try {
     parts_->undo();
     throw StoreError("cannot store the commit in " + parts_->file.string() + ": " + error.what() +
                      "; the stored configuration is as it was: check the free space and the state"
-                     " of its file system, and commit again");
+                     " of its file system, and try again");
 }
 
 std::vector<RecordedCommit> Store::history(std::uint64_t limit) const
@@ -200,12 +200,21 @@ const std::optional<Wait> &Store::wait() const noexcept
     return parts_->wait;
 }
 
-void Store::confirm()
+void Store::end_wait(Confirmation as)
 {
-    parts_->transact("store the confirmation", [this] {
-        parts_->history.end_wait(parts_->wait, Confirmation::confirmed, std::nullopt);
-    });
+    parts_->transact("store the end of the wait for a confirmation",
+                     [&] { parts_->history.end_wait(parts_->wait, as, std::nullopt); });
     parts_->wait.reset();
+}
+
+void Store::prolong_wait(std::int64_t now, std::uint32_t seconds)
+{
+    if (!parts_->wait)
+        return;
+    const Wait next{parts_->wait->number, parts_->wait->back_to, now + seconds, seconds};
+    parts_->transact("store the new time for a confirmation",
+                     [&] { parts_->history.begin_wait(next); });
+    parts_->wait = next;
 }
 
 void Store::note_undo_refusal(const std::string &why)

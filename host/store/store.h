@@ -79,8 +79,11 @@ class Store
     // The commit that is going to be undone, if the last one is.
     [[nodiscard]] const std::optional<Wait> &wait() const noexcept;
 
-    // Ends the wait: the commits stay.
-    void confirm();
+    // Ends the wait without another commit, which leaves the nodes as they are.
+    void end_wait(Confirmation as);
+
+    // Waits anew, from `now` on for so many seconds.
+    void prolong_wait(std::int64_t now, std::uint32_t seconds);
 
     // Records why the waiting commits could not be undone.
     void note_undo_refusal(const std::string &why);

@@ -72,6 +72,20 @@ TEST(TextInputTest, ANumberIsWholeAndFits)
     }
 }
 
+TEST(TextInputTest, ANumberIsInItsRange)
+{
+    EXPECT_EQ(checked_number("1", "N", {1, 3}), 1U);
+    EXPECT_EQ(checked_number("3", "N", {1, 3}), 3U);
+    for (const char *text : {"0", "4", "x"}) {
+        try {
+            static_cast<void>(checked_number(text, "N", {1, 3}));
+            ADD_FAILURE() << text;
+        } catch (const UsageError &error) {
+            EXPECT_STREQ(error.what(), "N must be a whole number from 1 to 3");
+        }
+    }
+}
+
 TEST(TextInputTest, AFileIsReadWhole)
 {
     const test::TempDir dir;

@@ -161,7 +161,7 @@ TEST_F(History, KnowsNoOtherCommits)
     for (const char *number : {"0", "2", "4294967295"}) {
         EXPECT_EQ(ovctl({"rollback", number}),
                   refused("mgmtd refused the rollback: there is no commit " + std::string(number) +
-                          " in the history: it goes back to commit 1\n"));
+                          " in the history: it holds only commit 1\n"));
     }
     for (const char *text : {"x", "-1", "4294967296", ""}) {
         EXPECT_EQ(ovctl({"rollback", "--", text}).exit_code, 2) << text;
@@ -229,6 +229,38 @@ TEST_F(History, UndoesWhatIsNotConfirmed)
                 ElementsAre("5: undo of commit 4, not confirmed in time", "4: [undone by 5]"));
     EXPECT_EQ(ovctl({"confirm"}),
               refused("mgmtd refused the confirmation: no commit waits to be confirmed\n"));
+}
+
+TEST_F(History, NamesAllThatWaitTogether)
+{
+    start();
+    set("/x", "1");
+    ASSERT_EQ(ovctl({"commit", "--confirm", "60"}).exit_code, 0);
+    set("/x", "2");
+    EXPECT_EQ(
+        ovctl({"commit", "--confirm", "90"}),
+        done("commit 3: 1 change\n"
+             "commits 2 to 3 are undone in 90 seconds unless confirmed: run ovctl confirm\n"));
+    EXPECT_EQ(ovctl({"commit", "--confirm", "600"}),
+              done("nothing to commit\ncommits 2 to 3 are undone in 600 seconds unless confirmed: "
+                   "run ovctl confirm\n"));
+    EXPECT_EQ(ovctl({"confirm"}), done("commits 2 to 3 are confirmed\n"));
+}
+
+TEST_F(History, AnUpgradeWaitsAndConfirmsLikeACommit)
+{
+    start();
+    const std::string entry = "/ov/tunneld/route_map/config/map/wan/prio/10/match/0/";
+    const std::string text = entry + "ipver,string,any\n" + entry + "protocol,string,tcp\n";
+    set("/x", "1");
+    ASSERT_EQ(ovctl({"commit", "--confirm", "60"}).exit_code, 0);
+    EXPECT_THAT(ovctl({"upgrade", "-", "--confirm", "600", "--comment", "taken over"}, text).out,
+                EndsWith("commits 2 to 3 are undone in 600 seconds unless confirmed: "
+                         "run ovctl confirm\n"));
+    EXPECT_THAT(ovctl({"history", "--limit", "1"}).out, HasSubstr("  [waiting] taken over\n"));
+    ASSERT_EQ(ovctl({"delete", "/ov/tunneld/route_map"}).exit_code, 0);
+    ASSERT_EQ(ovctl({"commit", "--confirm", "60"}).exit_code, 0);
+    EXPECT_THAT(ovctl({"upgrade", "-"}, text).out, EndsWith("commits 2 to 4 are confirmed\n"));
 }
 
 TEST_F(History, KeepsWhatIsConfirmed)
@@ -301,10 +333,10 @@ TEST_F(History, TellsWhyAnUndoIsRefused)
     ASSERT_EQ(ovctl({"commit", "--confirm", "1"}).exit_code, 0);
     await("commit 3 cannot be undone: " + paris + "/id: ID 0 was freed a short time ago");
     EXPECT_THAT(ovctl({"history"}).out,
-                HasSubstr("the last try to undo was refused: " + paris + "/id: ID 0 "));
+                HasSubstr("the last try to undo failed: " + paris + "/id: ID 0 "));
     EXPECT_THAT(ovctl({"show", "commit", "3"}).out,
                 AllOf(HasSubstr("confirmation        waiting\n"),
-                      HasSubstr("the last try to undo was refused: " + paris + "/id: ID 0 ")));
+                      HasSubstr("the last try to undo failed: " + paris + "/id: ID 0 ")));
     // The next try is made at the start, when no IDs are held back.
     ASSERT_EQ(stop(SIGTERM), 0);
     start();

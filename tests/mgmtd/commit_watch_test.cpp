@@ -132,8 +132,7 @@ TEST(ClientNote, BoundsTheComment)
     const std::string most(4096, 'x');
     EXPECT_EQ(fault(most), most);
     EXPECT_EQ(fault("two\nlines"), "two\nlines");
-    const std::string refusal =
-        "bad-value: \"comment\" must have at most 4096 bytes and no NUL character";
+    const std::string refusal = "bad-value: a comment has at most 4096 bytes and no NUL character";
     EXPECT_EQ(fault(most + "x"), refusal);
     EXPECT_EQ(fault(std::string("a\0b", 3)), refusal);
 }

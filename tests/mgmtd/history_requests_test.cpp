@@ -124,9 +124,12 @@ TEST_F(HistoryRequests, NeedSoundArguments)
                   "bad-value: \"confirm\" must be from 1 to 86400 seconds");
     }
     EXPECT_EQ(refusal({{"command", "rollback"}, {"number", 2}}),
-              "not-found: there is no commit 2 in the history: it goes back to commit 1");
+              "not-found: there is no commit 2 in the history: it holds only commit 1");
     EXPECT_EQ(refusal({{"command", "diff"}, {"after", 1}, {"to", 2}}),
-              "not-found: there is no commit 2 in the history: it goes back to commit 1");
+              "not-found: there is no commit 2 in the history: it holds only commit 1");
+    EXPECT_EQ(refusal({{"command", "diff"}, {"to", 1}}), "bad-request: \"after\" must be given");
+    EXPECT_EQ(refusal({{"command", "history"}, {"limit", 0}}),
+              "bad-value: \"limit\" must be 1 at least");
     EXPECT_EQ(refusal({{"command", "confirm"}}), "not-found: no commit waits to be confirmed");
 }
 
@@ -168,20 +171,22 @@ TEST_F(HistoryRequests, CommitThatWaitsTellsUntilWhen)
     EXPECT_EQ(ask({{"command", "status"}}).at("waits").at("number"), 2);
     EXPECT_EQ(recorded(2).at("confirmation").dump(),
               R"({"by":null,"state":"waiting","undo_refusal":null})");
-    EXPECT_EQ(ask({{"command", "confirm"}}).dump(), R"({"confirmed":2})");
+    EXPECT_EQ(ask({{"command", "confirm"}}).dump(), R"({"confirmed":{"back_to":1,"number":2}})");
     EXPECT_EQ(wait_changes_, 2);
     EXPECT_FALSE(ask({{"command", "status"}}).contains("waits"));
     EXPECT_FALSE(configuration_->confirmations().time_left());
 }
 
-TEST_F(HistoryRequests, NothingToCommitConfirmsAllTheSame)
+TEST_F(HistoryRequests, NothingToCommitConfirmsOrPutsOffAllTheSame)
 {
     commit("/x", "1", {{"confirm", 60}});
     const json again = ask({{"command", "commit"}, {"confirm", 600}});
     EXPECT_EQ(again.at("changes"), 0);
-    EXPECT_EQ(again.at("waits").at("seconds_left"), 60) << "there was nothing to wait for";
+    EXPECT_EQ(again.at("waits").dump(),
+              R"({"back_to":1,"number":2,"seconds_left":600,"undo_refusal":null})")
+        << "nothing to commit puts off the deadline all the same";
     EXPECT_EQ(ask({{"command", "commit"}}).dump(),
-              R"({"changes":0,"confirmed":2,"number":2,"warnings":[]})");
+              R"({"changes":0,"confirmed":{"back_to":1,"number":2},"number":2,"warnings":[]})");
 }
 
 TEST_F(HistoryRequests, AreUndoneWhenTheTimeIsOver)
@@ -215,6 +220,13 @@ TEST_F(HistoryRequests, UndoThatChangesNothingEndsTheWait)
     EXPECT_EQ(configuration_->commit_number(), 4U);
     EXPECT_FALSE(configuration_->confirmations().time_left());
     EXPECT_FALSE(ask({{"command", "status"}}).contains("waits"));
+    for (const unsigned number : {3U, 4U}) {
+        EXPECT_EQ(recorded(number).at("confirmation").dump(),
+                  R"({"by":null,"state":"undone","undo_refusal":null})")
+            << "nobody has confirmed it";
+    }
+    EXPECT_THAT(daemon_log(), Contains(HasSubstr("commits 3 to 4 were not confirmed in time")));
+    EXPECT_THAT(daemon_log(), testing::Not(Contains(HasSubstr("are confirmed"))));
 }
 
 TEST_F(HistoryRequests, RefusedUndoIsToldAndPutOff)
@@ -234,7 +246,7 @@ TEST_F(HistoryRequests, RefusedUndoIsToldAndPutOff)
     EXPECT_THAT(ask({{"command", "status"}}).at("waits").at("undo_refusal").get<std::string>(),
                 HasSubstr(why));
     // Who confirms now keeps the commit for good.
-    EXPECT_EQ(ask({{"command", "confirm"}}).dump(), R"({"confirmed":3})");
+    EXPECT_EQ(ask({{"command", "confirm"}}).dump(), R"({"confirmed":{"back_to":2,"number":3}})");
 }
 
 TEST_F(HistoryRequests, WaitGoesOnAfterARestart)

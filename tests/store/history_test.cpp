@@ -248,13 +248,43 @@ TEST(Wait, EndsWithTheConfirmation)
     {
         Store store = Store::open(scratch.path());
         store.commit({}, waiting(0, 60));
-        store.confirm();
+        store.end_wait(Confirmation::confirmed);
         EXPECT_FALSE(store.wait());
     }
     const Store store = Store::open(scratch.path());
     EXPECT_FALSE(store.wait());
     EXPECT_EQ(confirmation(store, 1), Confirmation::confirmed);
     EXPECT_FALSE(store.recorded(1).value().ended_by);
+}
+
+TEST(Wait, CanEndUndoneWithoutACommit)
+{
+    const ScratchDir scratch;
+    Store store = Store::open(scratch.path());
+    store.commit({}, waiting(0, 60));
+    store.end_wait(Confirmation::undone);
+    EXPECT_FALSE(store.wait());
+    EXPECT_EQ(confirmation(store, 1), Confirmation::undone);
+    EXPECT_FALSE(store.recorded(1).value().ended_by);
+}
+
+TEST(Wait, CanBeProlonged)
+{
+    const ScratchDir scratch;
+    const Wait expected{3, 1, 1100, 100};
+    {
+        Store store = Store::open(scratch.path());
+        store.commit({});
+        store.prolong_wait(1000, 100);
+        EXPECT_FALSE(store.wait()) << "none begins by it";
+        store.commit({}, waiting(0, 60));
+        store.commit({}, waiting(0, 60));
+        store.prolong_wait(1000, 100);
+        EXPECT_EQ(store.wait(), expected);
+    }
+    const Store store = Store::open(scratch.path());
+    EXPECT_EQ(store.wait(), expected);
+    EXPECT_EQ(confirmation(store, 3), Confirmation::waiting);
 }
 
 TEST(Wait, EndsWithAPlainCommit)

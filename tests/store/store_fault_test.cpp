@@ -235,9 +235,11 @@ TEST_P(StoreFault, AConfirmationIsStoredOrTheWaitGoesOn)
         {
             const FaultsFrom active(n, lasting);
             try {
-                store.confirm();
+                store.end_wait(ovhost::Confirmation::confirmed);
             } catch (const StoreError &error) {
-                EXPECT_THAT(error.what(), testing::StartsWith("cannot store the confirmation in "));
+                EXPECT_THAT(
+                    error.what(),
+                    testing::StartsWith("cannot store the end of the wait for a confirmation in "));
                 acknowledged = false;
                 ++refusals;
             }
@@ -392,7 +394,7 @@ TEST(StoreLimit, ACommitThatDoesNotFitIsRefusedAndTheStoreGoesOn)
     EXPECT_EQ(answer,
               "cannot store the commit in " + (scratch / "config.db").string() +
                   ": disk I/O error (File too large); the stored configuration is as it was:"
-                  " check the free space and the state of its file system, and commit again");
+                  " check the free space and the state of its file system, and try again");
     const Store store = Store::open(scratch.path());
     EXPECT_EQ(nodes_of(store), (Nodes{{"/a", {10, "1"}}, {"/b", {10, "2"}}, {"/big", {10, "b"}}}));
     EXPECT_EQ(store.commit_number(), 3U);
