@@ -1,7 +1,8 @@
-// Paths of any length, and child lists that may be null.
+// Paths of any length; absent.h has the lists that they lead to.
 #pragma once
 
 #include "framework/bail.h"
+#include "libovmd/frame/absent.h"
 #include "libovmd/frame/owners.h"
 
 // Builds a path and leaves with 14001 when there is no memory for it. A debug line tells each one.
@@ -15,20 +16,3 @@
         }                                                                                          \
     } while (0)
 #define BUILD_PATH(path, ...) BUILD_PATH_FOR(__func__, path, __VA_ARGS__)
-
-namespace ovmd
-{
-
-// A list that was not handed out counts as empty.
-inline uint32 length_of(const tstr_array *names)
-{
-    return names != nullptr ? static_cast<uint32>(tstr_array_length_quick(names)) : 0;
-}
-
-// Null past the end.
-inline const char *part_of(const tstr_array *parts, uint32 index)
-{
-    return index < length_of(parts) ? tstr_array_get_str_quick(parts, index) : nullptr;
-}
-
-} // namespace ovmd

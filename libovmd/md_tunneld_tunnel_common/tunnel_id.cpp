@@ -5,6 +5,7 @@
 #include "framework/appliance.h"
 #include "framework/bail.h"
 #include "framework/sys_time.h"
+#include "libovmd/frame/absent.h"
 #include "libovmd/md_tunneld_tunnel_common/free_id_queue.h"
 #include "libovmd/md_tunneld_tunnel_common/unit.h"
 #include "orvale/md_tunneld_defs.h"
@@ -36,7 +37,7 @@ uint32 id_bound()
 unsigned char mark_of(const tstring *name)
 {
     uint32 hash = 2166136261u;
-    for (const char *c = ts_str(name); c != nullptr && *c != '\0'; ++c) {
+    for (const char *c = text_of(name); c != nullptr && *c != '\0'; ++c) {
         hash = (hash ^ static_cast<unsigned char>(*c)) * 16777619u;
     }
     return static_cast<unsigned char>(hash >> 24); // where every character has left its trace
@@ -76,16 +77,34 @@ int init_tunnel_sorted_seq()
     return 0;
 }
 
-// What an earlier initialisation has left.
+// Where the sequence could not be made, the host is not asked to change it: the answer is the one
+// that an operation gives for null.
+int enter_sequence(uint32 id)
+{
+    return tunnel_sorted_seq != nullptr ? uint32_array_insert_sorted(tunnel_sorted_seq, id)
+                                        : lc_err_unexpected_null;
+}
+
+int leave_sequence(uint32 id)
+{
+    return tunnel_sorted_seq != nullptr ? uint32_array_delete_by_value(tunnel_sorted_seq, id)
+                                        : lc_err_unexpected_null;
+}
+
+// What an earlier initialisation has left; before the first there is nothing to be freed.
 void release_all()
 {
     for (uint32 id = 0; id < num_records; ++id) {
-        ts_free(&tunnel_ids[id].name);
+        if (tunnel_ids[id].name != nullptr) {
+            ts_free(&tunnel_ids[id].name);
+        }
     }
     free(tunnel_ids);
     tunnel_ids = nullptr;
     num_records = 0;
-    uint32_array_free(&tunnel_sorted_seq);
+    if (tunnel_sorted_seq != nullptr) {
+        uint32_array_free(&tunnel_sorted_seq);
+    }
     free_id_list.clear();
 }
 
@@ -179,13 +198,13 @@ int md_set_tunnel_id(uint32 id, const tstring *tun_name)
     tunnel_id_info &record = tunnel_ids[id];
     if (record.name != nullptr) {
         ts_free(&record.name);
-        BAIL_ERROR(uint32_array_delete_by_value(tunnel_sorted_seq, id));
+        BAIL_ERROR(leave_sequence(id));
     } else {
         free_id_list.remove(record);
     }
     BAIL_ERROR(ts_dup(tun_name, &record.name));
     name_marks[id] = mark_of(record.name);
-    BAIL_ERROR(uint32_array_insert_sorted(tunnel_sorted_seq, id));
+    BAIL_ERROR(enter_sequence(id));
     OV_LOG(ov_log_info, "TUN_IDS: SET tunnel index %d content to %s", id, ts_str(tun_name));
     return 0;
 }
@@ -209,7 +228,7 @@ int md_free_tunnel_id(const tstring *tun_name)
     ts_free(&record.name);
     record.last_use_ts = now_ms();
     // The ID is free whatever the sequence says: it must not be lost to both.
-    const int err = uint32_array_delete_by_value(tunnel_sorted_seq, id);
+    const int err = leave_sequence(id);
     if (err != 0) {
         (void)BAIL_REPORT(err);
     }
@@ -278,7 +297,7 @@ int md_get_tunnel_name_str_sorted(uint32 idx, const char **tun_name)
         return lc_err_not_found;
     }
     BAIL_NULL(tunnel_ids);
-    *tun_name = ts_str(tunnel_ids[id].name);
+    *tun_name = text_of(tunnel_ids[id].name);
     return 0;
 }
 

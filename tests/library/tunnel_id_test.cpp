@@ -91,6 +91,24 @@ TEST_F(TunnelIds, TheSequenceIsMadeAsTheHostExpectsIt)
                 ElementsAre("uint32_array_new_full(*, *)"));
 }
 
+TEST_F(TunnelIds, TheFirstBeginningFreesNothing)
+{
+    end_tunnel_ids();
+    planted().tunnel_bounds = {bound};
+    forget_calls();
+    EXPECT_EQ(in_library(md_init_tunnel_id), 0);
+    EXPECT_EQ(num_calls(Operation::ts_free), 0U);
+    EXPECT_EQ(num_calls(Operation::uint32_array_free), 0U);
+}
+
+TEST_F(TunnelIds, ANewBeginningFreesNamesAndSequence)
+{
+    take(0, 3);
+    EXPECT_EQ(in_library(md_init_tunnel_id), 0);
+    EXPECT_EQ(num_calls(Operation::ts_free), 3U);
+    EXPECT_EQ(num_calls(Operation::uint32_array_free), 1U);
+}
+
 TEST_F(TunnelIds, ANewBeginningForgetsEverything)
 {
     take(0, 3);
@@ -619,7 +637,33 @@ TEST_F(TunnelIdsWithoutSequence, BindingFailsAndTheNameIsFoundAllTheSame)
         log_lines(),
         ElementsAre(line_of("md_free_tunnel_id", "Error code 14001 (unexpected NULL) returned"),
                     gated_line(6, "TUN_IDS: Freed tunnel at index 0 (alpha)")));
+    EXPECT_EQ(num_calls(Operation::bail_debug), 1U);
     EXPECT_EQ(id_of("alpha"), "14004 77");
+    EXPECT_EQ(offer(2), "0 1 2");
+}
+
+TEST_F(TunnelIdsWithoutSequence, AnIdIsNotBoundAnewAndItsNameIsGone)
+{
+    EXPECT_EQ(set_id(0, "alpha"), 14001);
+    forget_calls();
+    EXPECT_EQ(set_id(0, "beta"), 14001);
+    EXPECT_THAT(log_lines(), ElementsAre(line_of("md_set_tunnel_id",
+                                                 "Error code 14001 (unexpected NULL) returned")));
+    EXPECT_EQ(num_calls(Operation::bail_debug), 1U);
+    EXPECT_EQ(num_calls(Operation::ts_dup), 0U);
+    EXPECT_EQ(id_of("alpha"), "14004 77");
+    EXPECT_EQ(id_of("beta"), "14004 77");
+    EXPECT_EQ(offer(1), "0 1");
+}
+
+TEST_F(TunnelIdsWithoutSequence, TheHostIsNotAskedAboutIt)
+{
+    EXPECT_EQ(set_id(0, "alpha"), 14001);
+    EXPECT_EQ(set_id(0, "beta"), 14001);
+    EXPECT_EQ(set_id(0, "gamma"), 14001);
+    EXPECT_EQ(free_id("gamma"), 14001);
+    EXPECT_EQ(num_calls(Operation::uint32_array_insert_sorted), 0U);
+    EXPECT_EQ(num_calls(Operation::uint32_array_delete_by_value), 0U);
 }
 
 // What a failing host array leaves: nothing is lost for good.
