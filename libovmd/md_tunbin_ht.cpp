@@ -140,6 +140,7 @@ const char *md_tunbin_ht_get_name_by_id(uint32 tid)
 
 uint32 md_tunbin_ht_get_id_by_name(const char *name)
 {
+    BAIL_NULL_ANSWER(name, TUNNEL_ID_NONE);
     uint32 tid = TUNNEL_ID_NONE;
     (void)tunbin_tunname_ht_find(name, &tid); // unknown and ambiguous names leave "none" behind
     return tid;
@@ -147,6 +148,7 @@ uint32 md_tunbin_ht_get_id_by_name(const char *name)
 
 uint32 md_tunbin_ht_get_id_by_alias(const char *alias)
 {
+    BAIL_NULL_ANSWER(alias, TUNNEL_ID_NONE);
     uint32 tid = TUNNEL_ID_NONE;
     (void)tunbin_tunalias_ht_find(alias, &tid);
     return tid;

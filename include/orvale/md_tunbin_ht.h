@@ -53,7 +53,8 @@ OV_API tbool md_tunbin_ht_id_has_tunnel(uint32 tid);
 /* The name of the ID's tunnel, borrowed until the ID is added or deleted; null when it has none. */
 OV_API const char *md_tunbin_ht_get_name_by_id(uint32 tid);
 
-/* The ID that a name or an alias leads to; 65535 when it is unknown or ambiguous. */
+/* The ID that a name or an alias leads to; 65535 when it is unknown or ambiguous, and for null,
+ * which is logged as an error. */
 OV_API uint32 md_tunbin_ht_get_id_by_name(const char *name);
 OV_API uint32 md_tunbin_ht_get_id_by_alias(const char *alias);
 

@@ -224,6 +224,16 @@ TEST_P(TextTable, TheSmallestAndTheLargestIdAreIds)
     EXPECT_EQ(find("t2"), "0 65533");
 }
 
+// IDs of tunnels have 16 bits, the tables' have 32.
+TEST_P(TextTable, LargerIdsAreNotCut)
+{
+    add("t1", 65536);
+    add("t2", 70000);
+    EXPECT_EQ(find("t1"), "0 65536");
+    EXPECT_EQ(find("t2"), "0 70000");
+    EXPECT_THAT(log_lines(), ElementsAre(added("t1", 65536), added("t2", 70000)));
+}
+
 TEST_P(TextTable, FindNeedsNoPlaceForTheId)
 {
     add("t1", 5);

@@ -115,6 +115,37 @@ TEST_F(TunnelCache, SaysWhatItAdds)
             gated_line(6, "md_tunbin_ht_add: added name=t1/alias=t1/id=7 to mgmt tun cache")));
 }
 
+TEST_F(TunnelCache, SaysWhatItAddsOfANameThatAnotherHas)
+{
+    EXPECT_EQ(add("t1", "a1", 7), 0);
+    const std::string name_key = key_of(table_operations[0], "t1");
+    const std::string alias_key = key_of(table_operations[1], "a2");
+    log_everything();
+    EXPECT_EQ(add("t1", "a2", 8), 0);
+    EXPECT_THAT(
+        log_lines(),
+        ElementsAre(
+            gated_line(3, "tunbin_tunname_ht_add: CONFLICT tunname t1 key=" + name_key + ", tid:8"),
+            gated_line(6, "tunbin_tunalias_ht_add: ADDED tunalias a2 key=" + alias_key + ", tid:8"),
+            gated_line(6, "md_tunbin_ht_add: added name=t1/alias=t1/id=8 to mgmt tun cache")));
+}
+
+TEST_F(TunnelCache, SaysWhatItAddsOfAnAliasThatAnotherHas)
+{
+    EXPECT_EQ(add("t1", "a1", 7), 0);
+    const std::string name_key = key_of(table_operations[0], "t2");
+    const std::string alias_key = key_of(table_operations[1], "a1");
+    log_everything();
+    EXPECT_EQ(add("t2", "a1", 8), 0);
+    EXPECT_THAT(
+        log_lines(),
+        ElementsAre(
+            gated_line(6, "tunbin_tunname_ht_add: ADDED tunname t2 key=" + name_key + ", tid:8"),
+            gated_line(3,
+                       "tunbin_tunalias_ht_add: CONFLICT tunalias a1 key=" + alias_key + ", tid:8"),
+            gated_line(6, "md_tunbin_ht_add: added name=t2/alias=t2/id=8 to mgmt tun cache")));
+}
+
 TEST_F(TunnelCache, ForgetsATunnel)
 {
     EXPECT_EQ(add("t1", "a1", 7), 0);
@@ -229,6 +260,28 @@ TEST_F(TunnelCache, TheNameOfAnInvalidIdIsAnError)
                 ElementsAre(gated_line(3, "md_tunbin_ht_get_name_by_id: invalid tunnel id 20000"),
                             gated_line(3, "md_tunbin_ht_get_name_by_id: invalid tunnel id 10022")));
     EXPECT_EQ(num_calls(Operation::bail_debug), 0U);
+}
+
+TEST_F(TunnelCache, AnInvalidIdHasNoTunnelAndThatIsNoError)
+{
+    log_everything();
+    for (const uint32 id : {10022U, 65535U, 4294967295U}) {
+        EXPECT_FALSE(has(id));
+    }
+    EXPECT_THAT(log_lines(), IsEmpty());
+    EXPECT_EQ(num_calls(Operation::bail_debug), 0U);
+}
+
+TEST_F(TunnelCache, NullLeadsToNoneAndIsAnError)
+{
+    log_everything();
+    EXPECT_EQ(in_library(md_tunbin_ht_get_id_by_name, nullptr), 65535U);
+    EXPECT_EQ(in_library(md_tunbin_ht_get_id_by_alias, nullptr), 65535U);
+    EXPECT_THAT(
+        log_lines(),
+        ElementsAre(error_line("md_tunbin_ht", "md_tunbin_ht_get_id_by_name", "Unexpected NULL"),
+                    error_line("md_tunbin_ht", "md_tunbin_ht_get_id_by_alias", "Unexpected NULL")));
+    EXPECT_EQ(num_calls(Operation::bail_debug), 2U);
 }
 
 TEST_F(TunnelCache, AnAliasOfTwoTunnelsLeadsToNone)
