@@ -72,12 +72,16 @@ struct ExpectedTrace {
         } else if (line.kind == Kind::unexpected) {
             lines.push_back(error_line(line.unit, line.function, "Unexpected NULL"));
             ++exits;
-        } else if (code == code_cancelled) {
-            quiet_exits += line.kind == Kind::error ? 0 : 1;
         } else {
-            lines.push_back(error_line(line.unit, line.function,
-                                       line.kind == Kind::bail ? bail_text(code) : text));
-            exits += line.kind == Kind::error ? 0 : 1;
+            const bool is_exit = line.kind == Kind::bail || line.kind == Kind::bail_text;
+            const bool is_code = line.kind == Kind::bail || line.kind == Kind::passed_over;
+            if (code == code_cancelled) {
+                quiet_exits += is_exit ? 1 : 0;
+            } else {
+                lines.push_back(
+                    error_line(line.unit, line.function, is_code ? bail_text(code) : text));
+                exits += is_exit ? 1 : 0;
+            }
         }
     }
 };

@@ -20,14 +20,15 @@ namespace ovtest
 // traces are written.
 struct ExpectedLine {
     enum class Kind {
-        bail,       // the code by the bail rule
-        bail_text,  // a text of its own in place of the code's, by the bail rule
-        unexpected, // "Unexpected NULL"
-        error,      // an error line that is not itself an error exit
-        told,       // the code as by the bail rule, cancelled or not, without an error exit
-        debug,      // a trace
-        gated,      // ov_log_internal
-        by_module,  // the same with the function, by the module gate
+        bail,        // the code by the bail rule
+        bail_text,   // a text of its own in place of the code's, by the bail rule
+        unexpected,  // "Unexpected NULL"
+        error,       // an error line that is not itself an error exit
+        told,        // the code as by the bail rule, cancelled or not, without an error exit
+        passed_over, // the same, but for a cancelled operation
+        debug,       // a trace
+        gated,       // ov_log_internal
+        by_module,   // the same with the function, by the module gate
     };
     Kind kind;
     std::string unit;
@@ -62,6 +63,10 @@ class UnitLines
     ExpectedLine told(const std::string &function) const
     {
         return {ExpectedLine::Kind::told, unit_, function};
+    }
+    ExpectedLine passed_over(const std::string &function) const
+    {
+        return {ExpectedLine::Kind::passed_over, unit_, function};
     }
     ExpectedLine debug(const std::string &function, const std::string &text) const
     {

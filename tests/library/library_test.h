@@ -8,6 +8,9 @@
 #include <gmock/gmock.h>
 #include <gtest/gtest.h>
 
+#include <cstddef>
+#include <filesystem>
+#include <iterator>
 #include <string>
 #include <vector>
 
@@ -24,6 +27,12 @@ inline std::string last_log_line()
 {
     const std::vector<std::string> lines = log_lines();
     return lines.empty() ? "" : lines.back();
+}
+
+inline std::ptrdiff_t num_open_descriptors()
+{
+    return std::distance(std::filesystem::directory_iterator("/proc/self/fd"),
+                         std::filesystem::directory_iterator());
 }
 
 class LibraryTest : public testing::Test

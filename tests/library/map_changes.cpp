@@ -1,6 +1,7 @@
 #include "tests/library/map_changes.h"
 
 #include "host/tree/name.h"
+#include "tests/support/fault_layer.h"
 
 #include <stdexcept>
 
@@ -56,6 +57,13 @@ void MapCommit::set_both(const std::string &name, const std::string &value)
 {
     set_old(name, value);
     set_new(name, value);
+}
+
+void MapCommit::name_handles()
+{
+    name_object(dbinfo.commit, "commit");
+    name_object(&olddb, "olddb");
+    name_object(&newdb, "newdb");
 }
 
 MapChange::MapChange(int change_type, const std::string &name,

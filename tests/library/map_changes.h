@@ -33,6 +33,9 @@ struct MapCommit {
     void set_new(const std::string &name, const std::string &value);
     void set_both(const std::string &name, const std::string &value);
 
+    // From now on calls show which is which: "commit", "olddb" and "newdb".
+    void name_handles();
+
     mdb_db olddb;
     mdb_db newdb;
     TestCommit commit;

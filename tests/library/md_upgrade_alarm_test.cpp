@@ -87,13 +87,10 @@ TEST_F(AlarmFile, TakesTheTextAsItIs)
 
 TEST_F(AlarmFile, IsClosedAfterEachAlarm)
 {
-    const auto num_open = [] {
-        return std::distance(fs::directory_iterator("/proc/self/fd"), fs::directory_iterator());
-    };
-    const auto before = num_open();
+    const auto before = num_open_descriptors();
     EXPECT_EQ(write("first"), 0);
     EXPECT_EQ(write("second"), 0);
-    EXPECT_EQ(num_open(), before);
+    EXPECT_EQ(num_open_descriptors(), before);
 }
 
 TEST_F(AlarmFile, IsWrittenWhetherOrNotItIsTold)
@@ -102,6 +99,18 @@ TEST_F(AlarmFile, IsWrittenWhetherOrNotItIsTold)
     EXPECT_EQ(write("silent"), 0);
     EXPECT_EQ(read_file(alarm_file), "silent\n");
     EXPECT_THAT(log_lines(), IsEmpty());
+}
+
+TEST_F(AlarmFile, IsToldByTheDaemonsThresholdBeforeTheGeneralOne)
+{
+    G_log_level = 7;
+    G_daemon_log_level = 5;
+    EXPECT_EQ(write("silent"), 0);
+    EXPECT_THAT(log_lines(), IsEmpty());
+    G_log_level = 0;
+    G_daemon_log_level = 6;
+    EXPECT_EQ(write("told"), 0);
+    EXPECT_THAT(log_lines(), ElementsAre(writing_line("told")));
 }
 
 // Alarms of one process, each long enough that half a line would be seen.

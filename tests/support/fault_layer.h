@@ -59,6 +59,14 @@ struct PlantedAnswers {
     std::optional<int> kernel_interfaces;
     // mgmt_is_same_subnet_using_masklen says yes to everything.
     bool one_subnet = false;
+    // bn_binding_name_parts_pattern_match says yes to everything.
+    bool every_name_matches = false;
+    // Of mdb_get_matching_tstr_array.
+    std::optional<std::vector<std::string>> matching_names;
+    // Of get_config_name, whether or not a host would answer so.
+    std::optional<std::string> config_name;
+    // ov_acl_validate_matchstr refuses with it, whatever pairs it has handed out.
+    std::optional<std::string> match_string_reason;
     // The library's so many-th call of tstr_array_get_str_quick, counted from 1, answers null; 0 is
     // none of them.
     unsigned null_text_at_call = 0;
@@ -72,11 +80,18 @@ unsigned num_calls(Operation operation);
 // any other pointer. "mdb_get_node_binding(null, *, "/ov/a", 0, *)".
 std::vector<std::string> calls_of(Operation operation);
 
+// From now on calls show a pointer to the object as this name.
+void name_object(const void *object, const std::string &name);
+
+// The names of all operations that were called, in order.
+std::vector<std::string> operations_called();
+
 // Kinds of the objects and texts that the host handed to the library and that are not yet freed,
 // one entry each. Texts (char *) are seen to end in builds with the allocation layer only.
 std::vector<std::string> live_objects();
 
-// Frees of objects that were not the library's, one line each.
+// Frees of objects that were not the library's, and questions about a string that is null to an
+// operation that need not have an answer, one line each.
 std::vector<std::string> misuses();
 
 // All log lines with all their arguments, in order. As error_line() and gated_line() write them.

@@ -84,6 +84,46 @@ TEST_F(FaultLayer, NoticesThatAForeignObjectIsFreed)
     EXPECT_THAT(misuses(), ElementsAre("the library freed a foreign tstring"));
 }
 
+TEST_F(FaultLayer, NoticesThatANullStringIsAskedAbout)
+{
+    EXPECT_EQ(in_library(ts_str_, nullptr), nullptr);
+    (void)in_library(ts_length_, nullptr);
+    (void)in_library(ts_equal_str, nullptr, "text", true);
+    (void)in_library(ts_cmp_str, nullptr, "text", false);
+    EXPECT_THAT(misuses(), ElementsAre("the library asked ts_str_ about null",
+                                       "the library asked ts_length_ about null",
+                                       "the library asked ts_equal_str about null",
+                                       "the library asked ts_cmp_str about null"));
+}
+
+TEST_F(FaultLayer, TheTestMayAskAboutANullString)
+{
+    EXPECT_EQ(ts_str_(nullptr), nullptr);
+    tstring *const string = in_library(new_string, "text");
+    EXPECT_FALSE(in_library(ts_equal_str, string, nullptr, true));
+    in_library(free_string, string);
+    EXPECT_THAT(misuses(), IsEmpty());
+}
+
+TEST_F(FaultLayer, CallsObjectsByTheirNames)
+{
+    tstr_array *array = nullptr;
+    name_object(host_.db(), "db");
+    (void)in_library(mdb_get_tstr_array, nullptr, host_.db(), "/ov", 0U, 0U, 0U, &array);
+    EXPECT_THAT(calls_of(Operation::mdb_get_tstr_array),
+                ElementsAre("mdb_get_tstr_array(null, db, \"/ov\", 0, 0, 0, *)"));
+    tstr_array_free(&array);
+}
+
+TEST_F(FaultLayer, KeepsOperationsInTheirOrder)
+{
+    in_library(free_string, in_library(new_string, "1"));
+    in_library(free_string, in_library(new_string, "2"));
+    EXPECT_THAT(operations_called(), ElementsAre("ts_new_str", "ts_free", "ts_new_str", "ts_free"));
+    forget_calls();
+    EXPECT_THAT(operations_called(), IsEmpty());
+}
+
 TEST_F(FaultLayer, MakesTheNthCallFail)
 {
     arm({.operation = Operation::ts_new_str, .call = 2});
@@ -221,6 +261,38 @@ TEST_F(FaultLayer, PlantsTheKernelsInterfacesAndASubnetOfAll)
     EXPECT_FALSE(same_subnet());
     planted().one_subnet = true;
     EXPECT_TRUE(same_subnet());
+}
+
+TEST_F(FaultLayer, PlantsTheModelsName)
+{
+    planted().config_name = "";
+    EXPECT_STREQ(in_library(get_config_name), "");
+}
+
+TEST_F(FaultLayer, PlantsNamesThatMatch)
+{
+    tstr_array *found = nullptr;
+    planted().matching_names = {"/a", "/b/c"};
+    EXPECT_EQ(in_library(mdb_get_matching_tstr_array, nullptr, host_.db(), "/none", 0U, &found), 0);
+    EXPECT_EQ(taken(found), "[/a, /b/c]");
+    tstr_array *parts = nullptr;
+    ASSERT_EQ(bn_binding_name_to_parts("/a/b", &parts, false), 0);
+    EXPECT_FALSE(in_library(bn_binding_name_parts_pattern_match, parts, true, "/other"));
+    planted().every_name_matches = true;
+    EXPECT_TRUE(in_library(bn_binding_name_parts_pattern_match, parts, true, "/other"));
+    tstr_array_free(&parts);
+}
+
+TEST_F(FaultLayer, PlantsTheRefusalOfAMatchString)
+{
+    tstr_array *keys = nullptr;
+    tstr_array *values = nullptr;
+    char *reason = nullptr;
+    planted().match_string_reason = "why not";
+    EXPECT_EQ(in_library(ov_acl_validate_matchstr, "dscp:ef", &keys, &values, &reason), 14012);
+    EXPECT_EQ(taken(keys), "[dscp]");
+    EXPECT_EQ(taken(values), "[ef]");
+    EXPECT_EQ(taken(reason), "why not");
 }
 
 TEST_F(FaultLayer, PlantsANullTextInAList)

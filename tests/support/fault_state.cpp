@@ -24,6 +24,7 @@ struct Records {
     std::vector<std::pair<Operation, std::string>> calls;
     std::vector<std::string> log;
     std::map<const void *, const char *> objects;
+    std::map<const void *, std::string> names;
     std::vector<std::string> misuses;
 };
 
@@ -140,6 +141,26 @@ std::vector<std::string> calls_of(Operation operation)
         }
     }
     return found;
+}
+
+void name_object(const void *object, const std::string &name)
+{
+    records().names[object] = name;
+}
+
+std::string name_of_object(const void *object)
+{
+    const auto found = records().names.find(object);
+    return found != records().names.end() ? found->second : std::string();
+}
+
+std::vector<std::string> operations_called()
+{
+    std::vector<std::string> names;
+    for (const auto &[called, call] : records().calls) {
+        names.emplace_back(row_of(called).name);
+    }
+    return names;
 }
 
 std::vector<std::string> live_objects()

@@ -28,6 +28,9 @@ class HostScope
 // Whether a host operation is being worked on: a call from within is the host's own.
 bool host_is_at_work();
 
+// Empty for an object without a name.
+std::string name_of_object(const void *object);
+
 void note_call(Operation operation, std::string call);
 void note_log_line(std::string line);
 

@@ -47,7 +47,7 @@ enum class OperationKind {
     ROW(query, bn_binding_get_str, 5)                                                              \
     ROW(status, bn_binding_get_uint32, 4)                                                          \
     ROW(status, bn_binding_get_tbool, 4)                                                           \
-    ROW(status, bn_binding_name_to_parts, 3)                                                       \
+    ROW(query, bn_binding_name_to_parts, 3)                                                        \
     ROW(yes_no, bn_binding_name_pattern_match, 2)                                                  \
     ROW(yes_no, bn_binding_name_parts_pattern_match, 3)                                            \
     ROW(query, bn_attrib_array_get_attrib_tstr, 3)                                                 \
@@ -89,7 +89,7 @@ enum class OperationKind {
     VARIADIC(pointer, smprintf)                                                                    \
     ROW(pointer, lc_enum_to_string_quiet_null, 2)                                                  \
     ROW(status, lc_string_to_enum, 3)                                                              \
-    ROW(status, lc_mask_or_masklen_to_masklen_str, 2)                                              \
+    ROW(query, lc_mask_or_masklen_to_masklen_str, 2)                                               \
     ROW(yes_no, mgmt_is_same_subnet_using_masklen, 4)                                              \
     ROW(status, lf_test_exists, 2)                                                                 \
     ROW(query, lf_read_file_lines, 2)                                                              \

@@ -8,6 +8,7 @@
 #include <cstdarg>
 #include <cstdio>
 #include <cstdlib>
+#include <cstring>
 #include <tuple>
 
 namespace ovtest
@@ -49,7 +50,11 @@ template <typename T>
 std::string described(T argument)
 {
     if constexpr (std::is_pointer_v<T>) {
-        return argument != nullptr ? "*" : "null";
+        if (argument == nullptr) {
+            return "null";
+        }
+        const std::string name = name_of_object(argument);
+        return name.empty() ? "*" : name;
     } else {
         return std::to_string(argument);
     }
@@ -182,6 +187,28 @@ constexpr bool gives_max_entries =
     operation == Operation::get_max_nmap_entries ||
     operation == Operation::get_max_dns_proxy_map_entries;
 
+int hand_out_names(const std::vector<std::string> &names, tstr_array **ret)
+{
+    int status = tstr_array_new(ret, nullptr);
+    for (const std::string &name : names) {
+        status = status != 0 ? status : tstr_array_append_str(*ret, name.c_str());
+    }
+    return status;
+}
+
+int refuse_with(const std::string &text, char **reason)
+{
+    std::free(*reason);
+    *reason = strdup(text.c_str());
+    return lc_err_parse_error;
+}
+
+template <std::size_t index, typename... Arguments>
+auto argument(Arguments... arguments)
+{
+    return std::get<index>(std::tuple(arguments...));
+}
+
 // The host's answer, or the one that the test has planted.
 template <Operation operation, typename Real, typename... Arguments>
 auto answer_of(Real *real, Arguments... arguments)
@@ -211,6 +238,23 @@ auto answer_of(Real *real, Arguments... arguments)
         if (planted().one_subnet) {
             return tbool{true};
         }
+    } else if constexpr (operation == Operation::bn_binding_name_parts_pattern_match) {
+        if (planted().every_name_matches) {
+            return tbool{true};
+        }
+    } else if constexpr (operation == Operation::get_config_name) {
+        if (planted().config_name) {
+            return planted().config_name->c_str();
+        }
+    } else if constexpr (operation == Operation::mdb_get_matching_tstr_array) {
+        if (planted().matching_names) {
+            return hand_out_names(*planted().matching_names, argument<4>(arguments...));
+        }
+    } else if constexpr (operation == Operation::ov_acl_validate_matchstr) {
+        if (planted().match_string_reason) {
+            (void)real(arguments...);
+            return refuse_with(*planted().match_string_reason, argument<3>(arguments...));
+        }
     } else if constexpr (gives_max_entries<operation>) {
         const auto found = planted().max_entries.find(operation);
         if (found != planted().max_entries.end()) {
@@ -219,6 +263,12 @@ auto answer_of(Real *real, Arguments... arguments)
     }
     return real(arguments...);
 }
+
+// What these answer about null is the host's own business.
+template <Operation operation>
+constexpr bool asks_about_a_string =
+    operation == Operation::ts_str_ || operation == Operation::ts_length_ ||
+    operation == Operation::ts_equal_str || operation == Operation::ts_cmp_str;
 
 // One call of an operation, by whomever: `real` gets the same arguments, and a format's text
 // behind them.
@@ -233,6 +283,12 @@ Answer host_call(Real *real, Arguments... arguments)
     const HostScope scope;
     if (by_library) {
         note_call(operation, described_call(row_of(operation).name, arguments...));
+        if constexpr (asks_about_a_string<operation>) {
+            if (argument<0>(arguments...) == nullptr) {
+                note_misuse(std::string("the library asked ") + row_of(operation).name +
+                            " about null");
+            }
+        }
         if (fault_strikes(operation)) {
             return failed_answer<Answer, row_of(operation).kind>(arguments...);
         }
