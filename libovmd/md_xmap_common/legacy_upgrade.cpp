@@ -54,11 +54,11 @@ constexpr char any_ipv6[] = "::/0";
 
 bool is_empty(const tstring *value)
 {
-    return ts_length(value) <= 0;
+    return value == nullptr || ts_length(value) <= 0;
 }
 
-// One entry on its way to a match string. Steps that fail hand their code up unlogged; where the
-// upgrade goes on after a failure, it is reported here, in the exported function's name.
+// One entry on its way to a match string; reports in the exported function's name, and whoever
+// calls a step that fails passes the code on without another line.
 class entry_upgrade
 {
   public:
@@ -67,11 +67,12 @@ class entry_upgrade
     {
     }
 
-    int read(const char *field, owned_tstring &value) const
+    int find_acl(bool &ret_has_acl) const
     {
-        char node[field_size];
-        name_of(field, node);
-        return mdb_get_node_value_tstr(nullptr, db_, node, 0, nullptr, value.out());
+        owned_tstring acl;
+        const int err = read("acl", acl);
+        ret_has_acl = err == 0 && !is_empty(acl.get());
+        return err;
     }
 
     int convert()
@@ -101,13 +102,23 @@ class entry_upgrade
         (void)snprintf(node, sizeof node, "%s/%s", match_node_, field);
     }
 
+    int read(const char *field, owned_tstring &value) const
+    {
+        char node[field_size];
+        name_of(field, node);
+        BAIL_ERROR_FOR(function_,
+                       mdb_get_node_value_tstr(nullptr, db_, node, 0, nullptr, value.out()));
+        return 0;
+    }
+
+    // The conversion goes on with a field that cannot be removed: it is told, and is no error exit.
     void remove(const char *field) const
     {
         char node[field_size];
         name_of(field, node);
         const int err = md_xmap_delete_match_binding(new_db_, node);
-        if (err != 0) {
-            (void)bail_report_error(err, function_, bail_unit, __LINE__);
+        if (err != 0 && err != lc_err_cancelled) {
+            bail_log_code(err, function_, bail_unit, __LINE__);
         }
     }
 
@@ -144,9 +155,10 @@ class entry_upgrade
         if (err != 0) {
             return err;
         }
-        const bool is_ipv6 = ts_equal_str(version.get(), "ipv6", false);
-        const bool is_ipv4 =
-            !is_ipv6 && !is_empty(version.get()) && !ts_equal_str(version.get(), "any", false);
+        const bool has_addresses =
+            !is_empty(version.get()) && !ts_equal_str(version.get(), "any", false);
+        const bool is_ipv6 = has_addresses && ts_equal_str(version.get(), "ipv6", false);
+        const bool is_ipv4 = has_addresses && !is_ipv6;
         for (const address_fields &fields : addresses) {
             if (is_ipv6 && err == 0) {
                 err = convert_ipv6(fields);
@@ -193,13 +205,9 @@ class entry_upgrade
             return 0;
         }
         owned_text length;
-        err = lc_mask_or_masklen_to_masklen_str(ts_str(mask.get()), length.out());
-        if (err != 0) {
-            return err;
-        }
-        if (length.get() == nullptr) {
-            return lc_err_unexpected_null;
-        }
+        BAIL_ERROR_FOR(function_,
+                       lc_mask_or_masklen_to_masklen_str(text_of(mask.get()), length.out()));
+        BAIL_NULL_FOR(function_, length.get());
         char prefix[address_size];
         (void)snprintf(prefix, sizeof prefix, "%s/%s", ts_str(address.get()), length.get());
         append(fields.key, prefix);
@@ -211,10 +219,11 @@ class entry_upgrade
         char node[field_size];
         name_of("matchstr", node);
         owned_binding binding;
-        const int err =
-            bn_binding_new_str(binding.out(), node, ba_value, bt_string, 0, match_string_);
-        return err != 0 ? err
-                        : mdb_set_node_binding(nullptr, new_db_, bsso_modify, 0, binding.get());
+        BAIL_ERROR_FOR(function_, bn_binding_new_str(binding.out(), node, ba_value, bt_string, 0,
+                                                     match_string_));
+        BAIL_ERROR_FOR(function_,
+                       mdb_set_node_binding(nullptr, new_db_, bsso_modify, 0, binding.get()));
+        return 0;
     }
 
     const char *function_;
@@ -253,11 +262,16 @@ int md_xmap_upgrade_to_pattern_match(mdb_db *new_db, const mdb_db *db, int mtype
             BAIL_NULL(priority);
             (void)snprintf(node, sizeof node, "%s/%s/prio/%s/match/0", type->root, map, priority);
             entry_upgrade entry(__func__, new_db, db, node);
-            owned_tstring acl;
-            BAIL_ERROR(entry.read("acl", acl));
+            bool has_acl = false;
+            int err = entry.find_acl(has_acl);
+            if (err == 0 && !has_acl) {
+                err = entry.convert();
+            }
+            if (err != 0) {
+                return err;
+            }
             pending = 0;
-            if (is_empty(acl.get())) {
-                BAIL_ERROR(entry.convert());
+            if (!has_acl) {
                 continue;
             }
             // An entry that matches by ACL keeps its other nodes and gets no match string. That

@@ -136,7 +136,8 @@ std::vector<FailureRow> common_failures(const Fields &fields, const std::string 
 // Each failing removal is told, and the field stays.
 std::vector<FailureRow> removal_failures(const Fields &fields, const std::string &match_string)
 {
-    const Lines told = {unit.bail("md_xmap_delete_match_binding"), unit.bail(upgrade_function)};
+    const Lines told = {unit.bail("md_xmap_delete_match_binding"),
+                        unit.passed_over(upgrade_function)};
     const std::string end = ", match string " + match_string;
     const auto once = [](Operation operation, std::size_t call, FaultWay way = FaultWay::fails) {
         return When{operation, static_cast<unsigned>(call), When::Lasting::once, way};
@@ -261,6 +262,11 @@ FaultRow ipv4_row()
     }
     failures.push_back({fails(Operation::lc_mask_or_masklen_to_masklen_str, 1), failed(fields, 6)});
     failures.push_back({fails(Operation::lc_mask_or_masklen_to_masklen_str, 2), failed(fields, 8)});
+    const Lines null = {unit.unexpected_null(upgrade_function)};
+    failures.push_back({hands_out_nothing(Operation::lc_mask_or_masklen_to_masklen_str, 1),
+                        {"14001" + kept(fields, 6), null}});
+    failures.push_back({hands_out_nothing(Operation::lc_mask_or_masklen_to_masklen_str, 2),
+                        {"14001" + kept(fields, 8), null}});
     // Without a mask there is none to convert.
     failures.push_back({hands_out_nothing(Operation::mdb_get_node_value_tstr, 5),
                         {"14001" + kept(fields, 6), {unit.bail(upgrade_function, 14001)}}});

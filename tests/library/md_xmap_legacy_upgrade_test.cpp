@@ -160,6 +160,55 @@ TEST_F(LegacyUpgrade, ReadsNoIpv4FieldsOfIpv6)
                             read_call("dscp")));
 }
 
+TEST_F(LegacyUpgrade, AsksNothingAboutAbsentFields)
+{
+    set(entry_node + "/comment", "x");
+    EXPECT_EQ(upgrade(), 0);
+    for (const Operation operation :
+         {Operation::ts_str_, Operation::ts_length_, Operation::ts_equal_str}) {
+        EXPECT_EQ(num_calls(operation), 0U) << row_of(operation).name;
+    }
+    EXPECT_THAT(log_lines(), ElementsAre(converted("any")));
+}
+
+TEST_F(LegacyUpgrade, ComparesAVersionWithAnyFirst)
+{
+    const std::string with_any = "ts_equal_str(*, \"any\", 0)";
+    const std::string with_ipv6 = "ts_equal_str(*, \"ipv6\", 0)";
+    set_field("ipver", "");
+    EXPECT_EQ(upgrade(), 0);
+    EXPECT_THAT(calls_of(Operation::ts_equal_str), IsEmpty());
+    set_field("ipver", "any");
+    EXPECT_EQ(upgrade(), 0);
+    EXPECT_THAT(calls_of(Operation::ts_equal_str), ElementsAre(with_any));
+    for (const char *version : {"ipv6", "ipv4"}) {
+        set_field("ipver", version);
+        forget_calls();
+        EXPECT_EQ(upgrade(), 0);
+        EXPECT_THAT(calls_of(Operation::ts_equal_str), ElementsAre(with_any, with_ipv6));
+    }
+}
+
+TEST_F(LegacyUpgrade, AsksAndWritesTheDatabaseThatIsMeant)
+{
+    set_field("dscp", "ef");
+    name_object(&old_db_, "old");
+    name_object(&new_db_, "new");
+    EXPECT_EQ(match_string(), "0 dscp:ef");
+    for (const std::string &call : calls_of(Operation::mdb_get_tstr_array)) {
+        EXPECT_THAT(call, testing::StartsWith("mdb_get_tstr_array(null, old, "));
+    }
+    for (const std::string &call : calls_of(Operation::mdb_get_node_value_tstr)) {
+        EXPECT_THAT(call, testing::StartsWith("mdb_get_node_value_tstr(null, old, "));
+    }
+    for (const std::string &call : calls_of(Operation::mdb_get_node_binding)) {
+        EXPECT_THAT(call, testing::StartsWith("mdb_get_node_binding(null, new, "));
+    }
+    EXPECT_THAT(calls_of(Operation::mdb_set_node_binding),
+                ElementsAre("mdb_set_node_binding(null, new, 2, 0, *)",
+                            "mdb_set_node_binding(null, new, 4, 0, *)"));
+}
+
 TEST_F(LegacyUpgrade, LooksForEveryFieldToRemoveInItsOrder)
 {
     for (const char *version : {"ipv4", "any"}) {
@@ -492,6 +541,18 @@ TEST_F(LegacyUpgrade, HandsNoMaskTextOnWhereThereIsNone)
                 ElementsAre(line_of(function_name, "Error code 14001 (unexpected NULL) returned")));
 }
 
+TEST_F(LegacyUpgrade, EndsAtAMaskThatBecomesNothing)
+{
+    set_field("ipver", "ipv4");
+    set_field(src_ipv4, "10.0.0.0");
+    set_field(src_mask, "8");
+    arm({.operation = Operation::lc_mask_or_masklen_to_masklen_str,
+         .way = FaultWay::without_object});
+    EXPECT_EQ(upgrade(), 14001);
+    EXPECT_THAT(log_lines(), ElementsAre(line_of(function_name, "Unexpected NULL")));
+    EXPECT_EQ(num_calls(Operation::bail_debug), 1U);
+}
+
 TEST_F(LegacyUpgrade, KeepsWhatWasConvertedBeforeAFailure)
 {
     set(root + "/m/prio/1/match/0/dscp", "1");
@@ -530,6 +591,8 @@ TEST_F(LegacyUpgrade, LogsARemovalThatFailsAndGoesOn)
                                     "Error code 14014 (generic IO error) returned"),
                             line_of(function_name, "Error code 14014 (generic IO error) returned"),
                             converted("application:web,dscp:ef")));
+    // The removal's own error exit; that the upgrade goes on is none.
+    EXPECT_EQ(num_calls(Operation::bail_debug), 1U);
 }
 
 TEST_F(LegacyUpgrade, LogsEveryRemovalThatFailsAndGoesOn)
@@ -557,6 +620,8 @@ TEST_F(LegacyUpgrade, GoesOnSilentlyAfterARemovalThatWasCancelled)
     EXPECT_THAT(nodes(new_db_, root),
                 ElementsAre(match_node + "dscp string ef", match_node + "matchstr string dscp:ef"));
     EXPECT_THAT(log_lines(), ElementsAre(converted("dscp:ef")));
+    EXPECT_EQ(num_calls(Operation::bail_debug), 0U);
+    EXPECT_EQ(num_calls(Operation::bail_quiet_debug), 1U);
 }
 
 // An entry with an ACL, whose clean-up is made to fail.
