@@ -30,7 +30,7 @@ OV_C_BEGIN
  * looked up as a name. Refuses with "Invalid protocol number %d.\n" or "Unknown protocol %s.\n".
  *
  * dbinfo  its commit takes the refusal
- * found   receives true, or false after a refusal
+ * found   receives true, also when `proto` is null, or false after a refusal
  * Returns 0, refused or not; 14001 when an argument or the commit is null; lc_string_to_enum's
  * code.
  */
@@ -48,8 +48,8 @@ OV_NODISCARD OV_API int md_validate_proto(md_dbinfo *dbinfo, const char *proto, 
  * does not.
  *
  * Returns 0, also for a change that does not matter here and for an unknown kind of map; 14001 when
- * an argument or the new database is null or memory has run out; the code of a query or write. What
- * was written before a failure stays.
+ * an argument or the new database is null, the changed node has too short a name or memory has run
+ * out; the code of a query or write. What was written before a failure stays.
  */
 OV_NODISCARD OV_API int md_acl_ref_processing(mdb_db_change *change, md_dbinfo *dbinfo, int mtype);
 
@@ -58,8 +58,8 @@ OV_NODISCARD OV_API int md_acl_ref_processing(mdb_db_change *change, md_dbinfo *
  * The entries are found by the references of the old database. Of the ACL's name 255 characters
  * count.
  *
- * Returns 0, refused or not; 14001 when an argument is null, a reference has too short a name or
- * memory has run out; the code of a query.
+ * Returns 0, refused or not; 14001 when an argument is null, the changed node or a reference has
+ * too short a name or memory has run out; the code of a query.
  */
 OV_NODISCARD OV_API int md_acl_not_used_in_map(mdb_db_change *change, md_dbinfo *dbinfo, int mtype);
 
@@ -69,8 +69,8 @@ OV_NODISCARD OV_API int md_acl_not_used_in_map(mdb_db_change *change, md_dbinfo 
 /*
  * Refuses a new set parameter of an entry that matches nothing in the new database.
  *
- * Returns 0; MD_XMAP_REFUSED; 14001 when an argument is null or memory has run out; the code of a
- * query.
+ * Returns 0; MD_XMAP_REFUSED; 14001 when an argument is null, the changed node has too short a name
+ * or memory has run out; the code of a query.
  */
 OV_NODISCARD OV_API int md_xmap_check_match_exists_for_set(mdb_db_change *change, md_dbinfo *dbinfo,
                                                            int mtype);
@@ -86,8 +86,8 @@ OV_NODISCARD OV_API int md_xmap_check_match_exists_for_set(mdb_db_change *change
  * only where the model's number is 0. An unknown kind is logged and has no limits.
  *
  * to_bail  receives whether the change is refused and is to be checked no further
- * Returns 0, refused or not; 14001 when an argument is null or memory has run out; the code of a
- * query.
+ * Returns 0, refused or not; 14001 when an argument is null, the changed node has too short a name
+ * or memory has run out; the code of a query.
  */
 OV_NODISCARD OV_API int md_xmap_common_change_check(mdb_db_change *change, md_dbinfo *dbinfo,
                                                     int mtype, tbool *to_bail);
@@ -161,10 +161,11 @@ OV_NODISCARD OV_API int md_xmap_delete_match_entries(mdb_db *db, int mtype, cons
  * written. An entry with an ACL gets none, and only its "application" is removed.
  *
  * mtype  one of the five kinds that have an older form: MAP_TYPE_R to MAP_TYPE_N
- * Returns 0; 14002 for another kind, of which nothing is touched; 14001 when a database is null;
- * the code of a query, a mask's conversion or the write, which ends the upgrade: what was converted
- * stays. The code of a failing removal is logged only, but for that of an entry with an ACL when no
- * further list or entry is read after it, which is returned.
+ * Returns 0; 14002 for another kind, of which nothing is touched; 14001 when a database is null or
+ * the conversion of a mask hands out nothing; the code of a query, a mask's conversion or the
+ * write. Such a failure ends the upgrade: what was converted stays. The code of a failing removal
+ * is logged only, but for that of an entry with an ACL when no further list or entry is read after
+ * it, which is returned.
  */
 OV_NODISCARD OV_API int md_xmap_upgrade_to_pattern_match(mdb_db *new_db, const mdb_db *db,
                                                          int mtype);

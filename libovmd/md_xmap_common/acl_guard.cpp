@@ -42,6 +42,7 @@ int find_references(const removed_acl &acl, owned_tstr_array &references)
 // have another.
 int entry_names_acl(const removed_acl &acl, const char *reference, bool &ret_names)
 {
+    BAIL_NULL_FOR(acl.function, reference);
     owned_tstr_array parts;
     BAIL_ERROR_FOR(acl.function, bn_binding_name_to_parts(reference, parts.out(), false));
     const char *const map = part_of(parts.get(), reference_map_part);
@@ -88,8 +89,10 @@ int md_acl_not_used_in_map(mdb_db_change *change, md_dbinfo *dbinfo, int mtype)
         OV_LOG(ov_log_error, "UNKNOWN map type");
         return 0;
     }
+    const char *const removed = part_of(change->mdc_name_parts, acl_part);
+    BAIL_NULL(removed);
     char name[acl_name_size];
-    (void)snprintf(name, sizeof name, "%s", part_of(change->mdc_name_parts, acl_part));
+    (void)snprintf(name, sizeof name, "%s", removed);
     const removed_acl acl = {__func__, dbinfo, *type, name};
 
     owned_tstr_array references;

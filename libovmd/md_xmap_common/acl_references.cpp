@@ -98,6 +98,7 @@ int process_acl(const mdb_db_change *change, const reference_update &update)
         BAIL_ERROR_FOR(update.function, bn_attrib_array_get_attrib_tstr(change->mdc_new_attribs,
                                                                         ba_value, new_acl.out()));
     }
+    BAIL_NO_ENTRY_FOR(update.function, update.entry);
     if (is_default(update.entry)) {
         return 0;
     }
@@ -106,7 +107,7 @@ int process_acl(const mdb_db_change *change, const reference_update &update)
     if (err != 0) {
         return err;
     }
-    OV_LOG(ov_log_info, "refcheck: acl=%s, %s-%s, old=%s", ts_str(new_acl.get()), update.entry.map,
+    OV_LOG(ov_log_info, "refcheck: acl=%s, %s-%s, old=%s", text_of(new_acl.get()), update.entry.map,
            update.entry.priority, old_acl.get());
     if (ts_num_chars(new_acl.get()) >= 1) {
         err = add_reference(update, ts_str(new_acl.get()));
@@ -119,6 +120,7 @@ int process_acl(const mdb_db_change *change, const reference_update &update)
 
 int process_removed_entry(const reference_update &update)
 {
+    BAIL_NO_ENTRY_FOR(update.function, update.entry);
     if (is_default(update.entry)) {
         return 0;
     }

@@ -20,6 +20,7 @@ int md_xmap_check_match_exists_for_set(mdb_db_change *change, md_dbinfo *dbinfo,
         return 0;
     }
     const map_entry entry = entry_of(*type, change);
+    BAIL_NO_ENTRY_FOR(__func__, entry);
     owned_text match;
     BUILD_PATH(match, "%s/%s/prio/%s/match", type->root, entry.map, entry.priority);
     owned_tstr_array children;
@@ -54,7 +55,7 @@ int md_xmap_common_change_check(mdb_db_change *change, md_dbinfo *dbinfo, int mt
 
     owned_tstring match_string;
     if (type != nullptr && change->mdc_change_type != mdct_delete &&
-        name_matches(change, type->matchstr_pattern)) {
+        name_matches(change, type->matchstr_pattern) && change->mdc_new_attribs != nullptr) {
         // That it can be read is all that is asked here: md_xmap_validate_match_str says whether it
         // is good.
         BAIL_ERROR(

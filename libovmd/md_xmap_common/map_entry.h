@@ -15,13 +15,14 @@ struct map_entry {
     const char *priority;
 };
 
-// The node's name matches one of the kind's patterns, so that it has both components.
+// Of a node whose name is too short for them, map and priority are null.
 inline map_entry entry_of(const map_type &type, const mdb_db_change *change)
 {
     return {type, part_of(change->mdc_name_parts, type.map_part),
             part_of(change->mdc_name_parts, type.priority_part)};
 }
 
+// Of an entry that has a priority.
 inline bool is_default(const map_entry &entry)
 {
     return strcmp(entry.priority, default_priority) == 0;
@@ -33,6 +34,14 @@ inline bool name_matches(const mdb_db_change *change, const char *pattern)
 }
 
 } // namespace ovmd
+
+// Leaves with 14001 without map or priority: which names match a pattern is the host's to say, and
+// one may be too short all the same.
+#define BAIL_NO_ENTRY_FOR(function, entry)                                                         \
+    do {                                                                                           \
+        BAIL_NULL_FOR(function, (entry).map);                                                      \
+        BAIL_NULL_FOR(function, (entry).priority);                                                 \
+    } while (0)
 
 // The node of the ACL that an entry names.
 #define BUILD_ACL_PATH_FOR(function, path, type, map, priority)                                    \

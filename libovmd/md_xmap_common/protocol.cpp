@@ -19,8 +19,8 @@ int md_validate_proto(md_dbinfo *dbinfo, const char *proto, tbool *found)
     BAIL_NULL(dbinfo);
     BAIL_NULL(dbinfo->commit);
     BAIL_NULL(found);
-    BAIL_NULL(proto);
     *found = true;
+    BAIL_NULL(proto);
 
     const auto number = static_cast<int32>(strtol(proto, nullptr, 10));
     if (number != 0) {

@@ -61,8 +61,9 @@ int find_entry(const parameter_search &search, const tstr_array *nodes, owned_ts
 {
     const uint32 num_nodes = length_of(nodes);
     for (uint32 i = 0; i < num_nodes; ++i) {
-        BAIL_ERROR_FOR(search.function, bn_binding_name_to_parts(tstr_array_get_str_quick(nodes, i),
-                                                                 parts.out(), false));
+        const char *const node = tstr_array_get_str_quick(nodes, i);
+        BAIL_NULL_FOR(search.function, node);
+        BAIL_ERROR_FOR(search.function, bn_binding_name_to_parts(node, parts.out(), false));
         bool found = false;
         const int err = has_value(search, parts.get(), found);
         if (err != 0 || found) {

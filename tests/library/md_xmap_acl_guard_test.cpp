@@ -119,6 +119,63 @@ TEST_P(AclGuardOfEveryKind, TheHostIsAskedAsItExpects)
     EXPECT_THAT(calls_of(Operation::ts_cmp_str), ElementsAre("ts_cmp_str(*, \"a1\", 0)"));
 }
 
+TEST_P(AclGuardOfEveryKind, EachDatabaseIsAskedForItsOwn)
+{
+    const MapKind &kind = GetParam();
+    give_entry(kind, "m1", "10");
+    commit_.name_handles();
+    EXPECT_EQ(remove_acl(kind), 0);
+    EXPECT_THAT(
+        calls_of(Operation::mdb_get_matching_tstr_array),
+        ElementsAre("mdb_get_matching_tstr_array(commit, olddb, \"/ov/tunneld/acl/config/a1/" +
+                    std::string(kind.key) + "/*/prio/*\", 4608, *)"));
+    EXPECT_THAT(calls_of(Operation::mdb_get_node_value_tstr),
+                ElementsAre("mdb_get_node_value_tstr(commit, newdb, \"" +
+                            kind.acl_node("m1", "10") + "\", 0, null, *)"));
+}
+
+// A reference has its map as the seventh component of its name and its priority as the ninth.
+TEST_P(AclGuardOfEveryKind, AReferenceWithATooShortNameIsAnError)
+{
+    const MapKind &kind = GetParam();
+    const std::string key_level = std::string(removed_acl) + '/' + kind.key;
+    for (const std::string &name : {key_level, key_level + "/m1", key_level + "/m1/prio"}) {
+        forget_calls();
+        planted().matching_names = {name};
+        EXPECT_EQ(remove_acl(kind), 14001);
+        EXPECT_THAT(log_lines(),
+                    ElementsAre(search_line(), use_line(kind, 1), line_of("Unexpected NULL")));
+        EXPECT_EQ(num_calls(Operation::bail_debug), 1U);
+        EXPECT_EQ(num_calls(Operation::mdb_get_node_value_tstr), 0U);
+    }
+    EXPECT_THAT(refused(), IsEmpty());
+}
+
+TEST_P(AclGuardOfEveryKind, AReferenceWithoutPartsIsAnError)
+{
+    const MapKind &kind = GetParam();
+    give_entry(kind, "m1", "10");
+    arm({.operation = Operation::bn_binding_name_to_parts, .way = FaultWay::without_object});
+    EXPECT_EQ(remove_acl(kind), 14001);
+    EXPECT_THAT(log_lines(),
+                ElementsAre(search_line(), use_line(kind, 1), line_of("Unexpected NULL")));
+    EXPECT_EQ(num_calls(Operation::bail_debug), 1U);
+}
+
+// The first text that is asked for is the ACL's name.
+TEST_P(AclGuardOfEveryKind, AReferenceWithoutNameIsAnError)
+{
+    const MapKind &kind = GetParam();
+    give_entry(kind, "m1", "10");
+    planted().null_text_at_call = 2;
+    EXPECT_EQ(remove_acl(kind), 14001);
+    EXPECT_THAT(log_lines(),
+                ElementsAre(search_line(), use_line(kind, 1), line_of("Unexpected NULL")));
+    EXPECT_EQ(num_calls(Operation::bail_debug), 1U);
+    EXPECT_EQ(num_calls(Operation::bn_binding_name_to_parts), 0U);
+    EXPECT_THAT(refused(), IsEmpty());
+}
+
 TEST_P(AclGuardOfEveryKind, AnAclWithoutReferencesGoes)
 {
     const MapKind &kind = GetParam();
@@ -393,6 +450,16 @@ TEST_F(AclGuard, NullArgumentsAreRefused)
     EXPECT_EQ(in_library(md_acl_not_used_in_map, change.record(), nullptr, 0), 14001);
     EXPECT_THAT(log_lines(), ElementsAre(line_of("Unexpected NULL"), line_of("Unexpected NULL")));
     EXPECT_EQ(num_calls(Operation::bail_debug), 2U);
+}
+
+// Which names match is the host's to say.
+TEST_F(AclGuard, AnAclWithATooShortNameIsAnError)
+{
+    planted().every_name_matches = true;
+    EXPECT_EQ(check(MAP_TYPE_R, mdct_delete, "/ov/tunneld/acl/config"), 14001);
+    EXPECT_THAT(log_lines(), ElementsAre(line_of("Unexpected NULL")));
+    EXPECT_EQ(num_calls(Operation::bail_debug), 1U);
+    EXPECT_EQ(num_calls(Operation::mdb_get_matching_tstr_array), 0U);
 }
 
 TEST_F(AclGuard, WithoutADatabaseTheHostsCodeIsPassedUp)

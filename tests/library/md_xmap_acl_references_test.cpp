@@ -128,6 +128,43 @@ TEST_P(ReferencesOfEveryKind, TheHostIsAskedAsItExpects)
         ElementsAre("mdb_set_node_binding(*, *, 4, 0, *)", "mdb_set_node_binding(*, *, 2, 0, *)"));
 }
 
+TEST_P(ReferencesOfEveryKind, EachDatabaseIsAskedForItsOwn)
+{
+    const MapKind &kind = GetParam();
+    give_acl(kind, "m1", "10", "a1");
+    commit_.name_handles();
+    EXPECT_EQ(set_acl(kind, "m1", "10", "a2"), 0);
+    EXPECT_THAT(calls_of(Operation::mdb_get_node_binding),
+                ElementsAre("mdb_get_node_binding(commit, olddb, \"" + kind.acl_node("m1", "10") +
+                            "\", 0, *)"));
+    EXPECT_THAT(calls_of(Operation::mdb_get_tstr_array),
+                ElementsAre("mdb_get_tstr_array(commit, newdb, \"" + map_level("a1") +
+                            "/prio\", 0, 0, 0, *)"));
+    EXPECT_THAT(calls_of(Operation::mdb_set_node_binding),
+                ElementsAre("mdb_set_node_binding(commit, newdb, 4, 0, *)",
+                            "mdb_set_node_binding(commit, newdb, 2, 0, *)"));
+}
+
+// Which names match is the host's to say. Map and priority are asked for behind the new ACL.
+TEST_P(ReferencesOfEveryKind, ANodeWithATooShortNameIsAnError)
+{
+    const MapKind &kind = GetParam();
+    const std::string root = kind.root;
+    planted().every_name_matches = true;
+    for (const std::string &name : {root, root + "/m1", root + "/m1/prio"}) {
+        forget_calls();
+        EXPECT_EQ(process(kind.mtype, mdct_modify, name, "a1"), 14001);
+        EXPECT_THAT(log_lines(), ElementsAre(modify_line, line_of("Unexpected NULL")));
+        EXPECT_EQ(num_calls(Operation::bn_attrib_array_get_attrib_tstr), 1U);
+        forget_calls();
+        EXPECT_EQ(process(kind.mtype, mdct_delete, name), 14001);
+        EXPECT_THAT(log_lines(), ElementsAre(line_of("Unexpected NULL")));
+        EXPECT_EQ(num_calls(Operation::bail_debug), 1U);
+        EXPECT_EQ(num_calls(Operation::mdb_get_node_binding), 0U);
+    }
+    EXPECT_THAT(references(), IsEmpty());
+}
+
 TEST_P(ReferencesOfEveryKind, AnotherAclTakesTheReference)
 {
     const MapKind &kind = GetParam();

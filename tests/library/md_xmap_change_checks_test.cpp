@@ -95,6 +95,30 @@ TEST_P(ChangeChecksOfEveryKind, AnEntryThatMatchesMaySet)
                                          path_line(match_node())));
 }
 
+TEST_P(ChangeChecksOfEveryKind, WhatItMatchesIsAskedOfTheProposedDatabase)
+{
+    commit_.name_handles();
+    EXPECT_EQ(add_set(), 80000);
+    EXPECT_THAT(
+        calls_of(Operation::mdb_get_tstr_array),
+        ElementsAre("mdb_get_tstr_array(commit, newdb, \"" + match_node() + "\", 0, 0, 0, *)"));
+}
+
+// Which names match is the host's to say.
+TEST_P(ChangeChecksOfEveryKind, ANodeWithATooShortNameIsAnError)
+{
+    const std::string root = GetParam().root;
+    planted().every_name_matches = true;
+    for (const std::string &name : {root, root + "/m1", root + "/m1/prio"}) {
+        forget_calls();
+        EXPECT_EQ(check_set(GetParam().mtype, mdct_add, name), 14001);
+        EXPECT_THAT(log_lines(), ElementsAre(line_of(set_function, "Unexpected NULL")));
+        EXPECT_EQ(num_calls(Operation::bail_debug), 1U);
+        EXPECT_EQ(num_calls(Operation::mdb_get_tstr_array), 0U);
+    }
+    EXPECT_THAT(refused(), IsEmpty());
+}
+
 TEST_P(ChangeChecksOfEveryKind, WhatItMatchedBeforeDoesNotCount)
 {
     commit_.set_old(match_node() + "/0/acl", "a1");
@@ -235,6 +259,15 @@ TEST_P(ChangeChecksOfEveryKind, TheCommonCheckReadsANewMatchString)
     forget_calls();
     EXPECT_EQ(check(GetParam().mtype, mdct_delete, name), "0 goes on");
     EXPECT_EQ(check(GetParam().mtype, mdct_add, GetParam().acl_node("m1", "10")), "0 goes on");
+    EXPECT_EQ(num_calls(Operation::bn_attrib_array_get_attrib_tstr), 0U);
+}
+
+TEST_P(ChangeChecksOfEveryKind, TheCommonCheckReadsNothingWhereNothingIsNew)
+{
+    const std::string name = GetParam().matchstr_node("m1", "10");
+    for (const int change_type : std::vector<int>{mdct_add, mdct_modify}) {
+        EXPECT_EQ(check(GetParam().mtype, change_type, name, std::nullopt), "0 goes on");
+    }
     EXPECT_EQ(num_calls(Operation::bn_attrib_array_get_attrib_tstr), 0U);
 }
 

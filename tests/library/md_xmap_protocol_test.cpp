@@ -321,11 +321,13 @@ TEST_F(Protocol, NullArgumentsAreRefused)
     EXPECT_EQ(in_library(md_validate_proto, nullptr, "6", &found), 14001);
     EXPECT_EQ(in_library(md_validate_proto, &without_commit, "6", &found), 14001);
     EXPECT_EQ(in_library(md_validate_proto, &commit_.dbinfo, "6", nullptr), 14001);
+    EXPECT_FALSE(found);
+    // The flag is set before the text is looked at.
     EXPECT_EQ(in_library(md_validate_proto, &commit_.dbinfo, nullptr, &found), 14001);
+    EXPECT_TRUE(found);
     const std::string line = error_line("md_xmap_common", function, "Unexpected NULL");
     EXPECT_THAT(log_lines(), ElementsAre(line, line, line, line));
     EXPECT_EQ(num_calls(Operation::bail_debug), 4U);
-    EXPECT_FALSE(found);
     EXPECT_EQ(refusal(), "0");
 }
 

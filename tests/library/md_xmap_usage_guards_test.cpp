@@ -134,6 +134,54 @@ TEST_F(PreferredInterface, EndsAtTheFirstFailedRead)
     EXPECT_EQ(num_calls(Operation::mdb_get_node_value_tstr), 1U);
 }
 
+TEST_F(PreferredInterface, IsLookedForInBothDatabases)
+{
+    set_mode("a/prio/10", "preferred-if");
+    map_commit_.name_handles();
+    EXPECT_EQ(is_used(), "0 yes");
+    EXPECT_THAT(calls_of(Operation::mdb_get_matching_tstr_array),
+                ElementsAre("mdb_get_matching_tstr_array(commit, newdb, "
+                            "\"/ov/tunneld/route_map/config/map/*/prio/*/set/0\", 4608, *)"));
+    EXPECT_THAT(calls_of(Operation::mdb_get_node_value_tstr),
+                ElementsAre("mdb_get_node_value_tstr(commit, olddb, \"" + root +
+                            "a/prio/10/set/0/auto_mod\", 0, null, *)"));
+}
+
+// A set node has its map as the sixth component of its name and its priority as the eighth.
+TEST_F(PreferredInterface, BehindANodeWithATooShortNameIsAnError)
+{
+    for (const char *name :
+         {"/ov/tunneld/route_map/config/map", "/ov/tunneld/route_map/config/map/a",
+          "/ov/tunneld/route_map/config/map/a/prio"}) {
+        forget_calls();
+        planted().matching_names = {name};
+        EXPECT_EQ(is_used(), "14001 no");
+        EXPECT_THAT(log_lines(),
+                    ElementsAre(line_of("md_preferred_if_is_used_in_rmap", "Unexpected NULL")));
+        EXPECT_EQ(num_calls(Operation::bail_debug), 1U);
+    }
+}
+
+TEST_F(PreferredInterface, BehindANodeWithoutPartsIsAnError)
+{
+    set_mode("a/prio/10", "preferred-if");
+    arm({.operation = Operation::bn_binding_name_to_parts, .way = FaultWay::without_object});
+    EXPECT_EQ(is_used(), "14001 no");
+    EXPECT_THAT(log_lines(),
+                ElementsAre(line_of("md_preferred_if_is_used_in_rmap", "Unexpected NULL")));
+    EXPECT_EQ(num_calls(Operation::bail_debug), 1U);
+}
+
+TEST_F(PreferredInterface, BehindANodeWithoutNameIsAnError)
+{
+    set_mode("a/prio/10", "preferred-if");
+    planted().null_text_at_call = 1;
+    EXPECT_EQ(is_used(), "14001 no");
+    EXPECT_THAT(log_lines(),
+                ElementsAre(line_of("md_preferred_if_is_used_in_rmap", "Unexpected NULL")));
+    EXPECT_EQ(num_calls(Operation::bn_binding_name_to_parts), 0U);
+}
+
 TEST_F(PreferredInterface, IsFoundInMapsOfLongNames)
 {
     const std::string entry = std::string(600, 'm') + "/prio/" + std::string(300, 'p');
@@ -264,6 +312,28 @@ TEST_F(UsedVlan, OfATooShortNameIsAnError)
     EXPECT_THAT(log_lines(), ElementsAre(line_of(function, "Unexpected NULL")));
     EXPECT_EQ(num_calls(Operation::bail_debug), 1U);
     EXPECT_EQ(num_calls(Operation::mdb_get_matching_tstr_array), 0U);
+}
+
+TEST_F(UsedVlan, BehindANodeWithATooShortNameIsAnError)
+{
+    planted().matching_names = {"/ov/tunneld/route_map/config/map/a/prio"};
+    EXPECT_EQ(remove("vlan7"), 14001);
+    EXPECT_THAT(log_lines(), ElementsAre(gated_line(5, "Checking 1 rmaps entries for VLAN vlan7."),
+                                         line_of(function, "Unexpected NULL")));
+    EXPECT_EQ(num_calls(Operation::bail_debug), 1U);
+    EXPECT_THAT(map_commit_.commit.refusals, IsEmpty());
+}
+
+// The first text that is asked for is the VLAN's name.
+TEST_F(UsedVlan, BehindANodeWithoutNameIsAnError)
+{
+    set_interface("a/prio/10", "vlan7");
+    planted().null_text_at_call = 2;
+    EXPECT_EQ(remove("vlan7"), 14001);
+    EXPECT_THAT(log_lines(), ElementsAre(gated_line(5, "Checking 1 rmaps entries for VLAN vlan7."),
+                                         line_of(function, "Unexpected NULL")));
+    EXPECT_EQ(num_calls(Operation::bn_binding_name_to_parts), 0U);
+    EXPECT_THAT(map_commit_.commit.refusals, IsEmpty());
 }
 
 TEST_F(UsedVlan, OfALongNameIsCutAt255Characters)
