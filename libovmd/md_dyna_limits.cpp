@@ -74,14 +74,15 @@ class limits_file
     bool complete_ = false;
 };
 
-int read_limit(const mdb_db *db, const char *node, uint32 &ret_limit)
+// An absent node leaves the limit alone; reports in `function`'s name.
+int read_limit(const char *function, const mdb_db *db, const char *node, uint32 &ret_limit)
 {
     owned_binding binding;
-    const int err = mdb_get_node_binding(nullptr, db, node, 0, binding.out());
-    if (err != 0 || binding.get() == nullptr) {
-        return err;
+    BAIL_ERROR_FOR(function, mdb_get_node_binding(nullptr, db, node, 0, binding.out()));
+    if (binding.get() != nullptr) {
+        BAIL_ERROR_FOR(function, bn_binding_get_uint32(binding.get(), ba_value, 0, &ret_limit));
     }
-    return bn_binding_get_uint32(binding.get(), ba_value, 0, &ret_limit);
+    return 0;
 }
 
 } // namespace
@@ -97,7 +98,10 @@ int write_dyna_limits_conf(const mdb_db *new_db)
     BAIL_NULL(file.get());
     for (const limit_line *line = limit_lines; line->node != nullptr; ++line) {
         uint32 limit = 0;
-        BAIL_ERROR(read_limit(new_db, line->node, limit));
+        const int err = read_limit(__func__, new_db, line->node, limit);
+        if (err != 0) {
+            return err;
+        }
         // The format is signed: a limit beyond its range stands there as a negative number.
         (void)fprintf(file.get(), "%s %d\n", line->key, static_cast<int32>(limit));
     }

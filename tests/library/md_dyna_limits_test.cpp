@@ -189,6 +189,38 @@ TEST_F(LimitsFile, ALimitOfAnotherTypeLeavesNoFile)
     expect_no_file(line_of("Error code 14020 (type conversion failed) returned"));
 }
 
+TEST_F(LimitsFile, WhatWasReadIsReleasedBehindTheErrorExit)
+{
+    host_.set(std::string(limits_node) + "nm_ram_size", bt_string, "12");
+    EXPECT_EQ(write(), 14020);
+    const std::vector<std::string> called = operations_called();
+    ASSERT_GE(called.size(), 5U);
+    EXPECT_THAT(std::vector<std::string>(called.end() - 5, called.end()),
+                ElementsAre("bn_binding_get_uint32", "lc_enum_to_string_quiet_null",
+                            "lc_log_internal", "bail_debug", "bn_binding_free"));
+}
+
+TEST_F(LimitsFile, AFailureLeavesNoFileOpen)
+{
+    const auto before = num_open_descriptors();
+    for (const Operation operation :
+         {Operation::mdb_get_node_binding, Operation::bn_binding_get_uint32}) {
+        set("mem_size", "1");
+        for (const int code : {14004, 14120}) {
+            arm({.operation = operation, .code = code});
+            EXPECT_EQ(write(), code);
+            EXPECT_EQ(num_open_descriptors(), before);
+        }
+    }
+    disarm();
+    fs::create_directory(limits_file);
+    EXPECT_EQ(write(), 14001);
+    EXPECT_EQ(num_open_descriptors(), before);
+    fs::remove(limits_file);
+    EXPECT_EQ(write(), 0);
+    EXPECT_EQ(num_open_descriptors(), before);
+}
+
 TEST_F(LimitsFile, ANullDatabaseLeavesTheOldFileAlone)
 {
     ov_system_info.initialized = 1;
@@ -253,7 +285,9 @@ class FullDisk : public LimitsFile
 
 TEST_F(FullDisk, LeavesNoFile)
 {
+    const auto num_open = num_open_descriptors();
     EXPECT_EQ(write(), 14014);
+    EXPECT_EQ(num_open_descriptors(), num_open);
     expect_no_file(line_of("Error code 14014 (generic IO error) returned"));
 }
 
