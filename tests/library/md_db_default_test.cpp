@@ -261,6 +261,31 @@ TEST_F(DefaultFormat, TypesThatAlternateKeepTheirCodes)
     EXPECT_EQ(read(text), "0 | 200 [" + expected + "] | 0 null");
 }
 
+TEST_F(DefaultFormat, AFailingLookupIsThatOfItsLineAlone)
+{
+    const std::string text = "/a,uint32,1\n/b,string,x\n-/c,bool,true\n/d,string,y\n";
+    arm({.operation = Operation::lc_string_to_enum, .call = 2, .code = 14014});
+    EXPECT_EQ(read(text), "0 | 2 [/a 5 '1', /d 101 'y'] | 1 [/c 9 'true']");
+    EXPECT_THAT(log_lines(),
+                ElementsAre(line_of(converter, "Unable to convert string type"),
+                            line_of(parser, "Error code 14014 (generic IO error) returned")));
+    forget_calls();
+    arm({.operation = Operation::lc_string_to_enum, .call = 3, .code = 14014});
+    EXPECT_EQ(read(text), "0 | 3 [/a 5 '1', /b 101 'x', /d 101 'y'] | 0 []");
+    EXPECT_THAT(log_lines(),
+                ElementsAre(line_of(parser, "Error code 14014 (generic IO error) returned")));
+}
+
+TEST_F(DefaultFormat, ACancelledLookupOfAnEarlierLineIsSilent)
+{
+    arm({.operation = Operation::lc_string_to_enum, .call = 2, .code = 14120});
+    EXPECT_EQ(read("/a,uint32,1\n/b,string,x\n/c,bool,true\n"),
+              "0 | 2 [/a 5 '1', /c 9 'true'] | 0 null");
+    EXPECT_THAT(log_lines(), IsEmpty());
+    EXPECT_EQ(num_calls(Operation::bail_quiet_debug), 1U);
+    EXPECT_EQ(num_calls(Operation::bail_debug), 0U);
+}
+
 TEST_F(DefaultFormat, AnUnknownTypeGoesToTheHostEveryTime)
 {
     EXPECT_EQ(read("/a,odd,1\n/b,odd,1\n"), "14020 | 0 [] | 0 null");
@@ -424,6 +449,15 @@ TEST_F(ModelDefaults, WithoutModelNameThereAreNone)
     EXPECT_EQ(read(), nothing);
     EXPECT_EQ(num_calls(Operation::conf_file_okay), 0U);
     EXPECT_THAT(log_lines(), IsEmpty());
+}
+
+TEST_F(ModelDefaults, AnEmptyModelNameIsAName)
+{
+    planted().config_name = "";
+    write_file("/opt/orvale/defdb.conf.", "/a,string,x\n");
+    EXPECT_EQ(read(), "0 | 1 [/a 101 'x'] | 0 untouched");
+    EXPECT_THAT(calls_of(Operation::conf_file_okay),
+                ElementsAre("conf_file_okay(\"/opt/orvale/defdb.conf.\")"));
 }
 
 TEST_F(ModelDefaults, ARejectedFileHasNone)

@@ -100,6 +100,8 @@ TEST_F(Event, AnAdditionWithoutValuesHasThreeBindings)
     EXPECT_THAT(sent(), ElementsAre(TestSession::Event{
                             "/mgmtd/notify/dbchange", std::string(change_type_binding) + "add",
                             index_binding, std::string(name_binding) + "/ov/a"}));
+    EXPECT_THAT(log_lines(),
+                ElementsAre(gated_line(5, "DBC event sent: param=/ov/a, old=(null), new=(null)")));
 }
 
 TEST_F(Event, EachValueIsLeftOutByItself)
@@ -116,6 +118,9 @@ TEST_F(Event, EachValueIsLeftOutByItself)
                                                std::string(change_type_binding) + "delete",
                                                index_binding, std::string(name_binding) + "/ov/a",
                                                std::string(old_binding) + "1"}));
+    EXPECT_THAT(log_lines(),
+                ElementsAre(gated_line(5, "DBC event sent: param=/ov/a, old=(null), new=2"),
+                            gated_line(5, "DBC event sent: param=/ov/a, old=1, new=(null)")));
 }
 
 TEST_F(Event, BadContentIsNotSent)
@@ -243,6 +248,21 @@ TEST_F(Event, AMessageThatCannotBeMadeIsLogged)
     EXPECT_THAT(log_lines(), ElementsAre(gated_line(3, "Cannot allocate event msg, err=14000 "),
                                          gated_line(3, "Cannot allocate event msg, err=14000 ")));
     EXPECT_THAT(sent(), IsEmpty());
+}
+
+// The first binding finds out.
+TEST_F(Event, AMessageThatDoesNotComeIsLogged)
+{
+    host_.connect_jsond();
+    arm({.operation = Operation::bn_event_request_msg_create,
+         .and_later = true,
+         .way = FaultWay::without_object});
+    send("/ov/a", "2", "1");
+    send2("add", "/ov/a", nullptr, nullptr);
+    const std::string line = gated_line(3, "Cannot add 'type' binding to msg, err=14001");
+    EXPECT_THAT(log_lines(), ElementsAre(line, line));
+    EXPECT_THAT(sent(), IsEmpty());
+    EXPECT_EQ(num_calls(Operation::bn_request_msg_send), 0U);
 }
 
 TEST_F(Event, AMessageThatCannotBeMadeIsGated)

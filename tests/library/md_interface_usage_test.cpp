@@ -543,6 +543,17 @@ TEST_F(EnableFlag, ThatMayNotBeWrittenPassesUpTheCode)
     EXPECT_EQ(num_calls(Operation::bail_debug), 1U);
 }
 
+TEST_F(EnableFlag, WithoutABindingIsAnError)
+{
+    set("wan0");
+    arm({.operation = Operation::bn_binding_new_str, .way = FaultWay::without_object});
+    EXPECT_EQ(enable("wan0"), 14001);
+    EXPECT_THAT(log_lines(), ElementsAre(line_of(function, "Unexpected NULL")));
+    EXPECT_EQ(num_calls(Operation::bail_debug), 1U);
+    EXPECT_EQ(num_calls(Operation::mdb_set_node_binding), 0U);
+    EXPECT_THAT(left(), ElementsAre("/net/interface/config/wan0 string x"));
+}
+
 TEST_F(EnableFlag, OfNullIsAnError)
 {
     EXPECT_EQ(in_library(md_set_if_enable, nullptr, "wan0", true), 14001);

@@ -148,6 +148,24 @@ TEST_F(Routes, GoWithoutACommitOrACount)
     });
 }
 
+TEST_F(Routes, AreThoseOfTheCallersCommitAndDatabase)
+{
+    in_own_process([this] {
+        add("10.1.0.0/16", "192.0.2.1");
+        name_object(static_cast<md_commit *>(&host_.commit()), "commit");
+        name_object(host_.db(), "db");
+        EXPECT_EQ(remove(), "0 1");
+        const std::string list = "/ov/tunneld/net/routes/config/ipv4/prefix";
+        EXPECT_THAT(calls_of(Operation::mdb_get_tstr_array),
+                    ElementsAre("mdb_get_tstr_array(commit, db, \"" + list + "\", 0, 0, 0, *)",
+                                "mdb_get_tstr_array(commit, db, \"" + list +
+                                    "/10.1.0.0\\/16/nhop\", 0, 0, 0, *)"));
+        EXPECT_THAT(calls_of(Operation::mdb_set_node_binding),
+                    ElementsAre("mdb_set_node_binding(commit, db, 2, 0, *)",
+                                "mdb_set_node_binding(commit, db, 2, 0, *)"));
+    });
+}
+
 TEST_F(Routes, MayBeNone)
 {
     in_own_process([this] {
@@ -165,6 +183,23 @@ TEST_F(Routes, GoInSilenceBelowTheThreshold)
         EXPECT_EQ(remove(), "0 1");
         EXPECT_THAT(left(), IsEmpty());
         EXPECT_THAT(log_lines(), IsEmpty());
+    });
+}
+
+TEST_F(Routes, AreToldByTheDaemonsThresholdBeforeTheGeneralOne)
+{
+    in_own_process([this] {
+        add("10.1.0.0/16", "192.0.2.1");
+        G_log_level = 7;
+        G_daemon_log_level = 5;
+        EXPECT_EQ(remove(), "0 1");
+        EXPECT_THAT(log_lines(), IsEmpty());
+        add("10.1.0.0/16", "192.0.2.1");
+        G_log_level = 0;
+        G_daemon_log_level = 6;
+        EXPECT_EQ(remove(), "0 1");
+        EXPECT_THAT(log_lines(),
+                    ElementsAre(deleted_line(std::string(root) + "10.1.0.0\\/16/nhop/192.0.2.1")));
     });
 }
 

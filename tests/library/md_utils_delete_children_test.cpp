@@ -90,6 +90,33 @@ TEST_F(Children, NeedNotBeCountedOrBelongToACommit)
                 ElementsAre("mdb_set_node_str(null, *, 2, 0, 101, \"\", \"%s\", \"/ov/list/1\")"));
 }
 
+TEST_F(Children, AreThoseOfTheCallersCommitAndDatabase)
+{
+    set("/ov/list/1");
+    name_object(static_cast<md_commit *>(&host_.commit()), "commit");
+    name_object(host_.db(), "db");
+    EXPECT_EQ(remove(), "0 1");
+    EXPECT_THAT(calls_of(Operation::mdb_get_tstr_array),
+                ElementsAre("mdb_get_tstr_array(commit, db, \"/ov/list\", 0, 0, 0, *)"));
+    EXPECT_THAT(
+        calls_of(Operation::mdb_set_node_str),
+        ElementsAre("mdb_set_node_str(commit, db, 2, 0, 101, \"\", \"%s\", \"/ov/list/1\")"));
+}
+
+TEST_F(Children, AreToldByTheDaemonsThresholdBeforeTheGeneralOne)
+{
+    set("/ov/list/1");
+    G_log_level = 7;
+    G_daemon_log_level = 5;
+    EXPECT_EQ(remove(), "0 1");
+    EXPECT_THAT(log_lines(), IsEmpty());
+    set("/ov/list/2");
+    G_log_level = 0;
+    G_daemon_log_level = 6;
+    EXPECT_EQ(remove(), "0 1");
+    EXPECT_THAT(log_lines(), ElementsAre(removed_line("2")));
+}
+
 TEST_F(Children, GoInSilenceBelowTheThreshold)
 {
     set("/ov/list/1");

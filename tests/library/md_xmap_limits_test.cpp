@@ -158,6 +158,28 @@ TEST_P(LimitsOfEveryKind, WithAMaximumOf0NoEntryIsAccepted)
     EXPECT_EQ(last_log_line(), maximum_reached(0));
 }
 
+// Doubled in 32 bits it is 0.
+TEST_P(LimitsOfEveryKind, WithAMaximumOf2147483648NoEntryIsAccepted)
+{
+    set_maximum(0x80000000);
+    EXPECT_EQ(add_entry(kind()), "0 refused");
+    EXPECT_THAT(commit_.commit.refusals, ElementsAre(entries_refused));
+    EXPECT_EQ(last_log_line(), maximum_reached(0));
+    set_maximum(0x80000001);
+    EXPECT_EQ(add_entry(kind()), "0 accepted");
+}
+
+TEST_P(LimitsOfEveryKind, TheyAreCountedInTheDatabaseBefore)
+{
+    give_entries(kind(), "m1", 1);
+    commit_.name_handles();
+    EXPECT_EQ(add_entry(kind()), "0 accepted");
+    EXPECT_EQ(add(kind().mtype, std::string(kind().root) + "/m2"), "0 accepted");
+    for (const std::string &call : calls_of(Operation::mdb_get_tstr_array)) {
+        EXPECT_THAT(call, testing::StartsWith("mdb_get_tstr_array(commit, olddb, "));
+    }
+}
+
 TEST_P(LimitsOfEveryKind, EntriesOfOtherKindsAreNoneOfThisOnes)
 {
     set_maximum(0);

@@ -72,6 +72,25 @@ TEST_F(MatchString, RefusedWithoutReasonHasNoneInTheMessage)
     EXPECT_THAT(map_commit_.commit.refusals, ElementsAre("1 Invalid match string dscp:ef - \n"));
 }
 
+TEST_F(MatchString, RefusedReleasesWhatTheHostHandsOutAllTheSame)
+{
+    planted().match_string_reason = "no room for it";
+    EXPECT_EQ(validate("dscp:ef,vlan:%"), "0 not valid");
+    EXPECT_THAT(map_commit_.commit.refusals,
+                ElementsAre("1 Invalid match string dscp:ef,vlan:% - no room for it\n"));
+    EXPECT_EQ(num_calls(Operation::tstr_array_get_str_quick), 0U);
+    EXPECT_EQ(num_calls(Operation::tstr_array_free), 2U);
+}
+
+TEST_F(MatchString, AsksForLabelsInTheProposedDatabase)
+{
+    map_commit_.name_handles();
+    EXPECT_EQ(validate("vlan:vlan7"), "0 valid");
+    EXPECT_THAT(calls_of(Operation::mdb_get_matching_tstr_array),
+                ElementsAre("mdb_get_matching_tstr_array(null, newdb, "
+                            "\"/ov/iflabels/config/*/vlan7\", 512, *)"));
+}
+
 TEST_F(MatchString, RefusedByWhateverCodeIsRefused)
 {
     for (const int code : {1, -1, 14001, 14120, 13999}) {
