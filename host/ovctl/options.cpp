@@ -20,7 +20,7 @@ constexpr const char *footer =
     "Exit codes:\n"
     "  0  done\n"
     "  1  mgmtd refused or failed, or a check found something; the messages say why\n"
-    "  2  the command line, or a file named on it, is wrong\n"
+    "  2  the command line, or a file named on it, is wrong, or the output cannot be written\n"
     "  3  mgmtd cannot be reached or did not answer\n"
     "  4  the answer was not understood\n\n"
     "Example:\n"
