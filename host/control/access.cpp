@@ -28,8 +28,9 @@ std::vector<gid_t> groups_of(int socket)
         groups.resize(size / sizeof(gid_t));
         result = ::getsockopt(socket, SOL_SOCKET, SO_PEERGROUPS, groups.data(), &size);
     }
-    if (result != 0)
+    if (result != 0) {
         fail();
+    }
     groups.resize(size / sizeof(gid_t));
     return groups;
 }
@@ -40,8 +41,9 @@ PeerCredentials credentials_of(int socket)
 {
     ucred credentials{};
     socklen_t size = sizeof(credentials);
-    if (::getsockopt(socket, SOL_SOCKET, SO_PEERCRED, &credentials, &size) != 0)
+    if (::getsockopt(socket, SOL_SOCKET, SO_PEERCRED, &credentials, &size) != 0) {
         fail();
+    }
     return {.pid = credentials.pid,
             .uid = credentials.uid,
             .gid = credentials.gid,
@@ -52,8 +54,9 @@ AccessPolicy::AccessPolicy(std::optional<gid_t> group) : users_{0, ::geteuid()},
 
 bool AccessPolicy::allows(const PeerCredentials &peer) const
 {
-    if (std::ranges::find(users_, peer.uid) != users_.end())
+    if (std::ranges::find(users_, peer.uid) != users_.end()) {
         return true;
+    }
     return group_ &&
            (peer.gid == *group_ || std::ranges::find(peer.groups, *group_) != peer.groups.end());
 }

@@ -69,8 +69,9 @@ std::string in_seconds(std::chrono::milliseconds span)
 
 Kind kind_of(const json &goodbye)
 {
-    if (goodbye == goodbye_code::replaced)
+    if (goodbye == goodbye_code::replaced) {
         return Kind::replaced;
+    }
     return goodbye == goodbye_code::stopping ? Kind::stopping : Kind::closed;
 }
 
@@ -92,8 +93,9 @@ void ControlClient::connect(const std::string &path)
     while (::connect(fd_.get(), reinterpret_cast<const sockaddr *>(&address), sizeof(address)) !=
            0) {
         // The queue of new connections is full: a busy daemon empties it.
-        if (errno != EAGAIN || steady_clock::now() >= deadline)
+        if (errno != EAGAIN || steady_clock::now() >= deadline) {
             fail_to_connect(path, errno);
+        }
         std::this_thread::sleep_for(Milliseconds(10));
     }
 }
@@ -114,8 +116,9 @@ json ControlClient::call(const std::string &command, const json &arguments)
         send_line(line);
     } catch (const ClientError &error) {
         // The daemon may have said why it closed before all was sent: that answer is read below.
-        if (error.kind() != Kind::closed)
+        if (error.kind() != Kind::closed) {
             throw;
+        }
     }
     return await_answer(command, last_id_);
 }
@@ -125,20 +128,24 @@ json ControlClient::await_answer(const std::string &command, long id)
     const auto deadline = steady_clock::now() + patience_;
     for (;;) {
         const auto line = read_line_until(deadline);
-        if (!line)
+        if (!line) {
             throw ClientError(Kind::timeout, "mgmtd did not answer \"" + command + "\" within " +
                                                  in_seconds(patience_) +
                                                  "; it may still be at work on it");
+        }
         const auto answer = take_message(*line);
-        if (!answer)
+        if (!answer) {
             continue;
+        }
         // An id of null: the request was so broken that its id could not be read.
         const json answered = answer->value("id", json());
-        if (!answered.is_null() && answered != id)
+        if (!answered.is_null() && answered != id) {
             fail_answer("an answer to request " + answered.dump() + ", request " +
                         std::to_string(id) + " is waiting");
-        if (answer->value("ok", false))
+        }
+        if (answer->value("ok", false)) {
             return answer->at("result");
+        }
         throw error_from_json(answer->at("error"));
     }
 }
@@ -148,10 +155,12 @@ std::optional<json> ControlClient::read_event(Milliseconds timeout)
     const auto deadline = steady_clock::now() + timeout;
     while (events_.empty()) {
         const auto line = read_line_until(deadline);
-        if (!line)
+        if (!line) {
             return std::nullopt;
-        if (take_message(*line))
+        }
+        if (take_message(*line)) {
             fail_answer("an answer to a request that was not made");
+        }
     }
     json event = std::move(events_.front());
     events_.pop_front();
@@ -174,10 +183,12 @@ try {
         return std::nullopt;
     }
     const json &verdict = message.at("ok");
-    if (!verdict.is_boolean() || !message.at(verdict ? "result" : "error").is_object())
+    if (!verdict.is_boolean() || !message.at(verdict ? "result" : "error").is_object()) {
         fail_answer("an answer that lacks its \"result\" or \"error\"");
-    if (!verdict)
+    }
+    if (!verdict) {
         static_cast<void>(error_from_json(message["error"]));
+    }
     return message;
 } catch (const RequestError &fault) {
     fail_answer(fault.what());
@@ -193,22 +204,26 @@ std::optional<std::string> ControlClient::read_line(Milliseconds timeout)
 std::optional<std::string> ControlClient::read_line_until(Deadline deadline)
 {
     for (;;) {
-        if (const auto line = input_.next())
+        if (const auto line = input_.next()) {
             return std::string(*line);
-        if (input_.too_long())
+        }
+        if (input_.too_long()) {
             fail_answer("a line longer than " + std::to_string(longest_answer) + " bytes");
+        }
         std::array<pollfd, 2> watched{{{.fd = fd_.get(), .events = POLLIN, .revents = 0},
                                        // poll() passes over a negative descriptor.
                                        {.fd = wake_fd_, .events = POLLIN, .revents = 0}}};
         const int ready = ::poll(watched.data(), watched.size(), patience_of_poll(deadline));
-        if (watched[1].revents != 0 || (ready == 0 && steady_clock::now() >= deadline))
+        if (watched[1].revents != 0 || (ready == 0 && steady_clock::now() >= deadline)) {
             return std::nullopt;
+        }
         tell_progress(told_.sent, told_.total);
-        if (ready > 0)
+        if (ready > 0) {
             receive_piece();
-        else if (ready < 0 && errno != EINTR)
+        } else if (ready < 0 && errno != EINTR) {
             throw ClientError(Kind::closed,
                               std::string("cannot wait for mgmtd: ") + std::strerror(errno));
+        }
     }
 }
 
@@ -220,10 +235,12 @@ void ControlClient::receive_piece()
         input_.feed({piece.data(), static_cast<std::size_t>(got)});
         return;
     }
-    if (got < 0 && (errno == EAGAIN || errno == EINTR))
+    if (got < 0 && (errno == EAGAIN || errno == EINTR)) {
         return;
-    if (goodbye_)
+    }
+    if (goodbye_) {
         throw ClientError(*goodbye_);
+    }
     throw ClientError(Kind::closed, "mgmtd closed the connection");
 }
 
@@ -240,14 +257,17 @@ void ControlClient::send_line(std::string_view text)
             sent += static_cast<std::size_t>(taken);
             continue;
         }
-        if (errno != EAGAIN && errno != EINTR)
+        if (errno != EAGAIN && errno != EINTR) {
             throw ClientError(Kind::closed,
                               std::string("mgmtd closed the connection: ") + std::strerror(errno));
+        }
         tell_progress(sent, line.size());
         pollfd watched{.fd = fd_.get(), .events = POLLOUT, .revents = 0};
-        if (::poll(&watched, 1, patience_of_poll(deadline)) == 0 && steady_clock::now() >= deadline)
+        if (::poll(&watched, 1, patience_of_poll(deadline)) == 0 &&
+            steady_clock::now() >= deadline) {
             throw ClientError(Kind::timeout,
                               "mgmtd did not take the request within " + in_seconds(patience_));
+        }
     }
     tell_progress(line.size(), line.size());
 }
@@ -255,8 +275,9 @@ void ControlClient::send_line(std::string_view text)
 void ControlClient::tell_progress(std::size_t sent, std::size_t total)
 {
     told_ = {.sent = sent, .total = total};
-    if (progress_)
+    if (progress_) {
         progress_(told_);
+    }
 }
 
 bool ControlClient::is_woken() const

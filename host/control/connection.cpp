@@ -28,8 +28,9 @@ timeval to_timeval(std::chrono::milliseconds span)
 EventPtr new_event(EventLoop &loop, int fd, short what, event_callback_fn callback, void *context)
 {
     EventPtr result(event_new(loop.base(), fd, what, callback, context));
-    if (!result)
+    if (!result) {
         throw std::runtime_error("cannot add a client to the event loop");
+    }
     return result;
 }
 
@@ -79,8 +80,9 @@ void Connection::guarded(void (Connection::*step)())
 
 void Connection::read_input()
 {
-    if (receive_piece())
+    if (receive_piece()) {
         serve();
+    }
 }
 
 /// False when there was nothing to receive, or the connection is over.
@@ -89,31 +91,35 @@ bool Connection::receive_piece()
     std::array<char, piece_size> piece;
     const ssize_t got = ::recv(fd_.get(), piece.data(), piece.size(), MSG_DONTWAIT);
     if (got < 0) {
-        if (errno != EAGAIN && errno != EINTR)
+        if (errno != EAGAIN && errno != EINTR) {
             end(errno == ECONNRESET ? std::string() : std::strerror(errno));
+        }
         return false;
     }
-    if (got == 0)
+    if (got == 0) {
         end_of_input_ = true;
-    else
+    } else {
         input_.feed({piece.data(), static_cast<std::size_t>(got)});
+    }
     return true;
 }
 
 void Connection::write_output()
 {
     flush();
-    if (!over_)
+    if (!over_) {
         serve();
+    }
 }
 
 void Connection::check_stall()
 {
-    if (progress_)
+    if (progress_) {
         await_writable();
-    else
+    } else {
         end("does not read: " + std::to_string(waiting()) + " bytes waited for " +
             std::to_string(limits_.stall_timeout.count()) + " ms");
+    }
 }
 
 /// The rest may have arrived while the daemon was busy, and then as much as the socket holds: that
@@ -122,10 +128,12 @@ void Connection::check_request()
 {
     const std::size_t before = input_.rest().size();
     overdue_ = true;
-    while (overdue_ && receive_piece())
+    while (overdue_ && receive_piece()) {
         serve();
-    if (!overdue_)
+    }
+    if (!overdue_) {
         return;
+    }
     const std::size_t size = input_.rest().size();
     if (size - before >= piece_size) {
         overdue_ = false;
@@ -140,8 +148,9 @@ void Connection::check_request()
 void Connection::serve()
 {
     // A handler that sends an event to its own client must not start a second round.
-    if (serving_ || finishing_)
+    if (serving_ || finishing_) {
         return;
+    }
     serving_ = true;
     waits_for_turn_ = false;
     const bool any = serve_lines();
@@ -150,12 +159,14 @@ void Connection::serve()
         drop_input();
         return;
     }
-    if (end_of_input_ || waits_for_turn_ || waiting() >= limits_.max_waiting)
+    if (end_of_input_ || waits_for_turn_ || waiting() >= limits_.max_waiting) {
         pause_reading();
-    else
+    } else {
         resume_reading();
-    if (!waits_for_turn_)
+    }
+    if (!waits_for_turn_) {
         watch_request(any);
+    }
     count_kept();
 }
 
@@ -165,16 +176,18 @@ bool Connection::serve_lines()
     bool any = false;
     const auto began = std::chrono::steady_clock::now();
     while (!over_ && !finishing_ && waiting() < limits_.max_waiting) {
-        if (any && turn_is_over(began))
+        if (any && turn_is_over(began)) {
             break;
+        }
         const auto line = input_.next();
         if (!line) {
             serve_end_of_input();
             break;
         }
         any = true;
-        if (line->find_first_not_of(" \t\r") != std::string_view::npos)
+        if (line->find_first_not_of(" \t\r") != std::string_view::npos) {
             send(owner_.answer(*this, *line));
+        }
     }
     return any;
 }
@@ -183,8 +196,9 @@ bool Connection::serve_lines()
 /// an event made active from here would come before the loop looks at the other sockets.
 bool Connection::turn_is_over(std::chrono::steady_clock::time_point began)
 {
-    if (std::chrono::steady_clock::now() - began < limits_.turn)
+    if (std::chrono::steady_clock::now() - began < limits_.turn) {
         return false;
+    }
     const timeval at_once{};
     event_add(turn_event_.get(), &at_once);
     waits_for_turn_ = true;
@@ -201,8 +215,9 @@ void Connection::serve_end_of_input()
         finish_with(error_line(nullptr, error));
         return;
     }
-    if (!end_of_input_)
+    if (!end_of_input_) {
         return;
+    }
     const std::string last(input_.rest());
     finish_with(last.find_first_not_of(" \t\r") == std::string::npos ? std::string()
                                                                      : owner_.answer(*this, last));
@@ -210,35 +225,42 @@ void Connection::serve_end_of_input()
 
 void Connection::send(std::string_view line)
 {
-    if (over_)
+    if (over_) {
         return;
+    }
     output_.append(line);
     flush();
 }
 
 bool Connection::send_event(std::string_view line)
 {
-    if (over_ || finishing_)
+    if (over_ || finishing_) {
         return false;
-    if (waiting() > 0)
+    }
+    if (waiting() > 0) {
         flush();
-    if (!over_ && waiting() > 0 && waiting() + line.size() > limits_.max_events_waiting)
+    }
+    if (!over_ && waiting() > 0 && waiting() + line.size() > limits_.max_events_waiting) {
         end("does not read: " + std::to_string(waiting()) + " bytes wait for it, " +
             std::to_string(limits_.max_events_waiting) + " may");
+    }
     send(line);
     return !over_;
 }
 
 void Connection::send_report(std::string_view line)
 {
-    if (over_ || finishing_)
+    if (over_ || finishing_) {
         return;
-    if (waiting() > 0)
+    }
+    if (waiting() > 0) {
         flush();
-    if (left_out_ > 0 || (waiting() > 0 && waiting() + line.size() > limits_.max_watch_waiting))
+    }
+    if (left_out_ > 0 || (waiting() > 0 && waiting() + line.size() > limits_.max_watch_waiting)) {
         ++left_out_;
-    else
+    } else {
         send(line);
+    }
 }
 
 void Connection::tell_gap()
@@ -250,8 +272,9 @@ void Connection::tell_gap()
 
 void Connection::finish_with(std::string_view line)
 {
-    if (over_)
+    if (over_) {
         return;
+    }
     finishing_ = true;
     pause_reading();
     drop_input();
@@ -267,20 +290,22 @@ void Connection::flush()
         return;
     }
     progress_ = progress_ || waiting() < before;
-    if (waiting() > 0)
+    if (waiting() > 0) {
         await_writable();
-    else if (finishing_)
+    } else if (finishing_) {
         end({});
-    else if (left_out_ > 0)
+    } else if (left_out_ > 0) {
         tell_gap();
+    }
 }
 
 /// A wait that is already under way goes on: sending more to one that does not read must not put
 /// off the end of its patience.
 void Connection::await_writable()
 {
-    if (event_pending(write_event_.get(), EV_WRITE, nullptr) != 0)
+    if (event_pending(write_event_.get(), EV_WRITE, nullptr) != 0) {
         return;
+    }
     progress_ = false;
     // The loop's clock stands still while a request is handled: without this the patience would
     // begin before the answer was there.
@@ -297,18 +322,21 @@ void Connection::pause_reading()
 
 void Connection::resume_reading()
 {
-    if (event_pending(read_event_.get(), EV_READ, nullptr) == 0)
+    if (event_pending(read_event_.get(), EV_READ, nullptr) == 0) {
         event_add(read_event_.get(), nullptr);
+    }
 }
 
 /// A request has its time from when it began, however often a piece of it comes.
 void Connection::watch_request(bool begins_anew)
 {
     const bool begun = !input_.rest().empty();
-    if (begins_anew || !begun)
+    if (begins_anew || !begun) {
         stop_request_timer();
-    if (!begun || overdue_ || event_pending(request_timer_.get(), EV_TIMEOUT, nullptr) != 0)
+    }
+    if (!begun || overdue_ || event_pending(request_timer_.get(), EV_TIMEOUT, nullptr) != 0) {
         return;
+    }
     event_base_update_cache_time(event_get_base(request_timer_.get()));
     const timeval patience = to_timeval(limits_.stall_timeout);
     event_add(request_timer_.get(), &patience);
@@ -325,23 +353,26 @@ void Connection::count_kept()
 {
     const std::size_t before = kept_;
     kept_ = input_.rest().size();
-    if (kept_ != before)
+    if (kept_ != before) {
         owner_.keeps(*this, before, kept_);
+    }
 }
 
 /// Not while a line is being served: it lies in the input.
 void Connection::drop_input()
 {
-    if (serving_)
+    if (serving_) {
         return;
+    }
     input_.clear();
     count_kept();
 }
 
 void Connection::end(const std::string &fault)
 {
-    if (over_)
+    if (over_) {
         return;
+    }
     over_ = true;
     pause_reading();
     drop_input();

@@ -28,8 +28,9 @@ namespace
 EventPtr watch(event_base *base, int fd, short what, event_callback_fn callback, void *context)
 {
     EventPtr result(event_new(base, fd, what, callback, context));
-    if (!result || event_add(result.get(), nullptr) != 0)
+    if (!result || event_add(result.get(), nullptr) != 0) {
         throw std::runtime_error("cannot add an event to the event loop");
+    }
     return result;
 }
 
@@ -37,10 +38,12 @@ EventPtr watch(event_base *base, int fd, short what, event_callback_fn callback,
 
 EventLoop::EventLoop() : base_(event_base_new()), wake_fd_(::eventfd(0, EFD_NONBLOCK | EFD_CLOEXEC))
 {
-    if (!base_)
+    if (!base_) {
         throw std::runtime_error("cannot create the event loop");
-    if (!wake_fd_)
+    }
+    if (!wake_fd_) {
         throw std::system_error(errno, std::generic_category(), "cannot create an eventfd");
+    }
     std::signal(SIGPIPE, SIG_IGN);
     wake_event_ = watch(base_.get(), wake_fd_.get(), EV_READ | EV_PERSIST, on_wake, this);
 }
@@ -49,9 +52,10 @@ EventLoop::~EventLoop() = default;
 
 void EventLoop::stop_on_signals()
 {
-    for (const int number : {SIGTERM, SIGINT})
+    for (const int number : {SIGTERM, SIGINT}) {
         signal_events_.push_back(
             watch(base_.get(), number, EV_SIGNAL | EV_PERSIST, on_signal, this));
+    }
 }
 
 int EventLoop::run()
@@ -94,8 +98,9 @@ void EventLoop::on_wake(int fd, short, void *loop)
         const std::lock_guard lock(self->mutex_);
         tasks.swap(self->tasks_);
     }
-    for (const auto &task : tasks)
+    for (const auto &task : tasks) {
         task();
+    }
 }
 
 } // namespace ovhost

@@ -22,14 +22,15 @@ bool is_too_deep(std::string_view line)
     bool in_text = false;
     for (std::size_t at = 0; at < line.size(); ++at) {
         const char character = line[at];
-        if (in_text && character == '\\')
+        if (in_text && character == '\\') {
             ++at;
-        else if (character == '"')
+        } else if (character == '"') {
             in_text = !in_text;
-        else if (!in_text && (character == '[' || character == '{') && ++depth > deepest)
+        } else if (!in_text && (character == '[' || character == '{') && ++depth > deepest) {
             return true;
-        else if (!in_text && (character == ']' || character == '}'))
+        } else if (!in_text && (character == ']' || character == '}')) {
             --depth;
+        }
     }
     return false;
 }
@@ -39,13 +40,16 @@ bool is_too_deep(std::string_view line)
 std::string fault_of(const json::exception &fault)
 {
     std::string text = fault.what();
-    if (const auto prefix = text.find("] "); prefix != std::string::npos)
+    if (const auto prefix = text.find("] "); prefix != std::string::npos) {
         text.erase(0, prefix + 2);
-    if (const auto token = text.find("; last read"); token != std::string::npos)
+    }
+    if (const auto token = text.find("; last read"); token != std::string::npos) {
         text.erase(token);
+    }
     constexpr std::size_t longest = 300;
-    if (text.size() > longest)
+    if (text.size() > longest) {
         text.resize(longest);
+    }
     return text;
 }
 
@@ -55,11 +59,13 @@ constexpr std::size_t most_details = 200;
 /// The beginning of a text that is too long to be read, cut between two characters.
 std::string shortened(std::string text)
 {
-    if (text.size() <= longest_text)
+    if (text.size() <= longest_text) {
         return text;
+    }
     std::size_t end = longest_text;
-    while (end > 0 && (static_cast<unsigned char>(text[end]) & 0xc0) == 0x80)
+    while (end > 0 && (static_cast<unsigned char>(text[end]) & 0xc0) == 0x80) {
         --end;
+    }
     const std::string left_out = std::to_string(text.size() - end);
     text.resize(end);
     return text + "... (" + left_out + " bytes more)";
@@ -75,8 +81,9 @@ json detail_json(const ErrorDetail &detail)
     json row = {{"node", shortened(detail.node)},
                 {"message", shortened(detail.message)},
                 {"module", detail.module}};
-    if (detail.line > 0)
+    if (detail.line > 0) {
         row["line"] = detail.line;
+    }
     return row;
 }
 
@@ -91,12 +98,14 @@ std::string to_line(const json &message)
 
 json parse_line(std::string_view line)
 {
-    if (const auto at = line.find('\0'); at != std::string_view::npos)
+    if (const auto at = line.find('\0'); at != std::string_view::npos) {
         throw RequestError(error_code::bad_json,
                            "not valid JSON: a NUL byte at column " + std::to_string(at + 1));
-    if (is_too_deep(line))
+    }
+    if (is_too_deep(line)) {
         throw RequestError(error_code::bad_json, "not valid here: values are nested deeper than " +
                                                      std::to_string(deepest));
+    }
     try {
         return json::parse(line);
     } catch (const json::exception &fault) {
@@ -107,21 +116,24 @@ json parse_line(std::string_view line)
 json parse_request(std::string_view line, json &id)
 {
     json request = parse_line(line);
-    if (!request.is_object())
+    if (!request.is_object()) {
         throw RequestError(error_code::bad_request,
                            std::string("a request is a JSON object, this is of type ") +
                                request.type_name());
+    }
     // A null id is one that was left out: the answer carries null for both.
     if (const auto given = request.find("id"); given != request.end() && !given->is_null()) {
-        if (!given->is_number_integer())
+        if (!given->is_number_integer()) {
             throw RequestError(error_code::bad_request,
                                std::string("\"id\" is a whole number, this is of type ") +
                                    given->type_name());
+        }
         id = *given;
     }
     const auto command = request.find("command");
-    if (command == request.end() || !command->is_string())
+    if (command == request.end() || !command->is_string()) {
         throw RequestError(error_code::bad_request, "a request needs a \"command\" of type string");
+    }
     return request;
 }
 
@@ -155,10 +167,12 @@ json error_to_json(const RequestError &error)
     json details = json::array();
     const std::vector<ErrorDetail> &all = error.details();
     const std::size_t told = all.size() <= most_details ? all.size() : most_details - 1;
-    for (std::size_t i = 0; i < told; ++i)
+    for (std::size_t i = 0; i < told; ++i) {
         details.push_back(detail_json(all[i]));
-    if (told < all.size())
+    }
+    if (told < all.size()) {
         details.push_back(detail_json({{}, more_text(all.size() - told), {}, 0}));
+    }
     return {{"code", error.code()},
             {"message", shortened(error.what())},
             {"details", std::move(details)}};
@@ -167,9 +181,10 @@ json error_to_json(const RequestError &error)
 RequestError error_from_json(const json &error)
 {
     std::vector<ErrorDetail> details;
-    for (const json &row : error.value("details", json::array()))
+    for (const json &row : error.value("details", json::array())) {
         details.push_back({row.value("node", ""), row.at("message").get<std::string>(),
                            row.value("module", ""), row.value("line", 0L)});
+    }
     return {error.at("code").get<std::string>(), error.at("message").get<std::string>(),
             std::move(details)};
 }

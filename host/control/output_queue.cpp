@@ -22,12 +22,13 @@ bool OutputQueue::write_to(int fd)
     while (size() > 0) {
         const ssize_t taken =
             ::send(fd, bytes_.data() + written_, size(), MSG_NOSIGNAL | MSG_DONTWAIT);
-        if (taken >= 0)
+        if (taken >= 0) {
             written_ += static_cast<std::size_t>(taken);
-        else if (errno == EAGAIN)
+        } else if (errno == EAGAIN) {
             return true;
-        else if (errno != EINTR)
+        } else if (errno != EINTR) {
             return false;
+        }
     }
     bytes_ = {};
     written_ = 0;

@@ -25,8 +25,9 @@ std::string describe(const ClientInfo &client)
 {
     std::string text = "client " + std::to_string(client.number) + " (pid " +
                        std::to_string(client.pid) + ", uid " + std::to_string(client.uid);
-    if (!client.peer.empty())
+    if (!client.peer.empty()) {
         text += ", peer " + client.peer;
+    }
     return text + ")";
 }
 
@@ -46,10 +47,11 @@ void check_peer_name(const std::string &name)
     constexpr const char *allowed =
         "abcdefghijklmnopqrstuvwxyzABCDEFGHIJKLMNOPQRSTUVWXYZ0123456789._-";
     if (name.empty() || name.size() > longest ||
-        name.find_first_not_of(allowed) != std::string::npos)
+        name.find_first_not_of(allowed) != std::string::npos) {
         throw RequestError(error_code::bad_request,
                            "command \"hello\": \"peer\" must be 1 to 64 letters, digits, dots, "
                            "hyphens or underscores");
+    }
 }
 
 } // namespace
@@ -70,8 +72,9 @@ ControlServer::ControlServer(EventLoop &loop, const std::string &socket_path,
       listener_(
           evconnlistener_new(loop.base(), on_accept, this, LEV_OPT_CLOSE_ON_EXEC, 0, socket_.fd()))
 {
-    if (!reap_event_ || !retry_accept_event_ || !listener_)
+    if (!reap_event_ || !retry_accept_event_ || !listener_) {
         throw std::runtime_error("cannot add socket " + socket_path + " to the event loop");
+    }
     evconnlistener_set_error_cb(listener_.get(), on_accept_error);
 }
 
@@ -81,11 +84,13 @@ ControlServer::~ControlServer()
     const std::string line = goodbye_line(goodbye_code::stopping, "mgmtd is stopping");
     // finish_with() may end a peer and take it out of the map.
     const auto peers = peers_;
-    for (const auto &[name, peer] : peers)
+    for (const auto &[name, peer] : peers) {
         peer.connection->finish_with(line);
+    }
     const auto watchers = watchers_;
-    for (const auto &[number, watcher] : watchers)
+    for (const auto &[number, watcher] : watchers) {
         watcher->finish_with(line);
+    }
 }
 
 void ControlServer::on_accept(evconnlistener *, int fd, sockaddr *, int, void *server)
@@ -132,14 +137,15 @@ void ControlServer::accept(UniqueFd fd)
     const bool full = connections_.size() >= limits_.max_clients;
     connections_.emplace(number, std::move(connection));
     log_(ControlLogLevel::debug, describe(added.client()) + " connected");
-    if (!access_.allows(peer))
+    if (!access_.allows(peer)) {
         turn_away(added, error_code::not_allowed,
                   "user " + added.client().user + " may not use this socket",
                   "be mgmtd's user, root, or a member of the group that mgmtd --group names");
-    else if (full)
+    } else if (full) {
         turn_away(added, error_code::busy,
                   std::to_string(limits_.max_clients) + " clients are connected, no more are taken",
                   "try again later");
+    }
 }
 
 void ControlServer::turn_away(Connection &connection, const char *code, const std::string &reason,
@@ -152,8 +158,9 @@ void ControlServer::turn_away(Connection &connection, const char *code, const st
 void ControlServer::keeps(Connection &, std::size_t before, std::size_t now)
 {
     unserved_ = unserved_ - before + now;
-    if (now > before && unserved_ > limits_.max_unserved)
+    if (now > before && unserved_ > limits_.max_unserved) {
         turn_away_largest();
+    }
 }
 
 /// The one that has left most, since the others have the better claim to what there is.
@@ -184,8 +191,9 @@ std::string ControlServer::answer(Connection &from, std::string_view line)
 
 json ControlServer::dispatch(Connection &from, const json &request)
 {
-    if (request.at("command") == "hello")
+    if (request.at("command") == "hello") {
         return hello(from, request);
+    }
     if (request.at("command") == "watch") {
         watchers_[from.client().number] = &from;
         return json::object();
@@ -198,13 +206,15 @@ json ControlServer::hello(Connection &from, const json &request)
     const std::string name = required_text(request, "peer");
     check_peer_name(name);
     const std::string &registered = from.client().peer;
-    if (!registered.empty() && registered != name)
+    if (!registered.empty() && registered != name) {
         throw RequestError(error_code::bad_request, "this connection is registered as peer " +
                                                         registered +
                                                         " already: use another connection");
+    }
     json result = {{"peer", name}, {"protocol", control_protocol_version}};
-    if (!registered.empty())
+    if (!registered.empty()) {
         return result;
+    }
 
     // The newest wins: a peer that was started again must not be kept out by the connection its
     // predecessor left behind.
@@ -231,10 +241,11 @@ void ControlServer::ended(Connection &connection, const std::string &fault)
         peers_.erase(peer);
         log_(ControlLogLevel::info, "peer " + client.peer + " is gone");
     }
-    if (fault.empty())
+    if (fault.empty()) {
         log_(ControlLogLevel::debug, describe(client) + " disconnected");
-    else
+    } else {
         log_(ControlLogLevel::warning, describe(client) + " was disconnected: " + fault);
+    }
 
     // It is still at work: the loop lets go of it once it has returned.
     const auto owned = connections_.find(client.number);
@@ -246,8 +257,9 @@ void ControlServer::ended(Connection &connection, const std::string &fault)
 bool ControlServer::send_to_peer(const std::string &name, const json &event)
 {
     const auto peer = peers_.find(name);
-    if (peer == peers_.end())
+    if (peer == peers_.end()) {
         return false;
+    }
     // Counted before: when sending ends the peer, its entry is gone afterwards.
     ++peer->second.events_sent;
     return peer->second.connection->send_event(event_line(event));
@@ -258,8 +270,9 @@ void ControlServer::report(const json &event)
     const std::string line = event_line(event);
     // Sending may end a watcher and take it out of the map.
     const auto watchers = watchers_;
-    for (const auto &[number, watcher] : watchers)
+    for (const auto &[number, watcher] : watchers) {
         watcher->send_report(line);
+    }
 }
 
 std::vector<PeerStatus> ControlServer::peers() const

@@ -16,12 +16,14 @@ namespace ovhost
 EventWriter::EventWriter(const std::string &path, int stop_fd)
     : name_(path.empty() ? "standard output" : path), fd_(STDOUT_FILENO), stop_fd_(stop_fd)
 {
-    if (path.empty())
+    if (path.empty()) {
         return;
+    }
     file_ = UniqueFd(::open(path.c_str(), O_WRONLY | O_CREAT | O_APPEND | O_CLOEXEC, 0644));
     fd_ = file_.get();
-    if (!file_)
+    if (!file_) {
         fail({errno, std::generic_category()});
+    }
 }
 
 bool EventWriter::write(const nlohmann::json &event)

@@ -24,12 +24,15 @@ int JsondPeer::run()
 {
     for (;;) {
         const End end = serve_one_connection();
-        if (end == End::stopped)
+        if (end == End::stopped) {
             return 0;
-        if (end == End::replaced || !options_.retry)
+        }
+        if (end == End::replaced || !options_.retry) {
             return 1;
-        if (!pause())
+        }
+        if (!pause()) {
             return 0;
+        }
     }
 }
 
@@ -46,18 +49,21 @@ try {
     constexpr std::chrono::hours no_hurry(1);
     for (;;) {
         const std::optional<json> event = client.read_event(no_hurry);
-        if (event && !writer_.write(*event))
+        if (event && !writer_.write(*event)) {
             return End::stopped;
-        if (!event && stop_wanted(0))
+        }
+        if (!event && stop_wanted(0)) {
             return End::stopped;
+        }
     }
 } catch (const RequestError &refusal) {
     report_once(std::string("mgmtd does not take jsond as a peer: ") + refusal.what());
     return End::lost;
 } catch (const ClientError &error) {
     // A stop also ends the wait for the answer to the hello.
-    if (stop_wanted(0))
+    if (stop_wanted(0)) {
         return End::stopped;
+    }
     if (error.kind() == ClientError::Kind::replaced) {
         report_(error.what());
         return End::replaced;
@@ -69,8 +75,9 @@ try {
 /// While mgmtd is away every try fails the same way: that is said once.
 void JsondPeer::report_once(const std::string &message)
 {
-    if (message == reported_)
+    if (message == reported_) {
         return;
+    }
     reported_ = message;
     report_(options_.retry ? message : message + " (--retry keeps trying)");
 }

@@ -61,8 +61,9 @@ Capabilities capabilities()
 {
     __user_cap_header_struct header{_LINUX_CAPABILITY_VERSION_3, 0};
     Capabilities sets{};
-    if (::syscall(SYS_capget, &header, sets.data()) != 0)
+    if (::syscall(SYS_capget, &header, sets.data()) != 0) {
         fail("reading capabilities", errno);
+    }
     return sets;
 }
 
@@ -71,8 +72,9 @@ Capabilities capabilities()
 void restore_capabilities(const Capabilities &sets)
 {
     __user_cap_header_struct header{_LINUX_CAPABILITY_VERSION_3, 0};
-    if (::syscall(SYS_capset, &header, sets.data()) != 0)
+    if (::syscall(SYS_capset, &header, sets.data()) != 0) {
         fail("dropping capabilities", errno);
+    }
 }
 
 void write_process_file(const std::string &name, const std::string &text)
@@ -107,8 +109,9 @@ void unshare_as_user()
 void unshare_mounts()
 {
     // What root may do, a container may forbid; a user namespace may still be allowed there.
-    if (::unshare(CLONE_NEWNS) != 0)
+    if (::unshare(CLONE_NEWNS) != 0) {
         unshare_as_user();
+    }
     // Else the mounts would spread to the machine.
     if (::mount(nullptr, "/", nullptr, MS_REC | MS_PRIVATE, nullptr) != 0) {
         fail("making the mounts private", errno, kAllowNamespaces);
@@ -130,8 +133,9 @@ UniqueFd make_directory(const UniqueFd &parent, const std::string &name, const f
         }
         opened = open_directory(parent.get(), name);
     }
-    if (!opened)
+    if (!opened) {
         fail("opening " + full.string(), errno, "it must be a directory and no link");
+    }
     return opened;
 }
 
@@ -143,8 +147,9 @@ UniqueFd make_directories(const UniqueFd &root, const fs::path &dir, const Fixed
         full /= name;
         at = make_directory(at, name.string(), full);
     }
-    for (const std::string &name : fixed.below)
+    for (const std::string &name : fixed.below) {
         make_directory(at, name, full / name);
+    }
     return at;
 }
 
@@ -152,8 +157,9 @@ UniqueFd make_directories(const UniqueFd &root, const fs::path &dir, const Fixed
 std::vector<UniqueFd> open_sources(const fs::path &dir)
 {
     const UniqueFd root(::open(dir.c_str(), O_PATH | O_DIRECTORY | O_CLOEXEC));
-    if (!root)
+    if (!root) {
         fail("opening " + dir.string(), errno, "make the directory first");
+    }
     std::vector<UniqueFd> sources;
     for (const FixedPath &fixed : fixed_paths()) {
         sources.push_back(make_directories(root, dir, fixed));
@@ -181,8 +187,9 @@ void show_entry(const fs::directory_entry &entry, const fs::path &covering)
         fs::create_directory(target);
     } else {
         const UniqueFd made(::open(target.c_str(), O_WRONLY | O_CREAT | O_EXCL | O_CLOEXEC, 0600));
-        if (!made)
+        if (!made) {
             fail("making " + target, errno);
+        }
     }
     bind(entry.path().string(), target);
 }
@@ -202,8 +209,9 @@ void add_mount_point(const fs::path &point)
     }
     for (const fs::directory_entry &entry : fs::directory_iterator(path_of(covered))) {
         // It may be there after all, as a link that leads nowhere or as a file.
-        if (entry.path().filename() != point.filename())
+        if (entry.path().filename() != point.filename()) {
             show_entry(entry, parent);
+        }
     }
     fs::create_directory(point);
 }
@@ -221,11 +229,13 @@ void cover(const fs::path &point, const UniqueFd &source)
 {
     std::error_code ignored;
     const bool present = fs::is_directory(point, ignored);
-    if (!present)
+    if (!present) {
         add_mount_point(point);
+    }
     bind(path_of(source), point.string());
-    if (!present)
+    if (!present) {
         make_read_only(point.parent_path());
+    }
 }
 
 } // namespace
@@ -239,8 +249,9 @@ void enter_private_root(const fs::path &dir)
     // Opened again, since mounts of another namespace cannot be bound; and all before the first
     // mount, which may hide the directory.
     const std::vector<UniqueFd> sources = open_sources(dir);
-    for (std::size_t i = 0; i < sources.size(); ++i)
+    for (std::size_t i = 0; i < sources.size(); ++i) {
         cover(fixed_paths()[i].path, sources[i]);
+    }
     restore_capabilities(before);
 }
 

@@ -154,11 +154,13 @@ json load_request(const Arguments &arguments)
 json commit_request(const Arguments &arguments)
 {
     json request = json::object();
-    if (const auto comment = arguments.find("comment"); comment != arguments.end())
+    if (const auto comment = arguments.find("comment"); comment != arguments.end()) {
         request["comment"] = checked_utf8(comment->second, "the comment");
-    if (const auto confirm = arguments.find("confirm"); confirm != arguments.end())
+    }
+    if (const auto confirm = arguments.find("confirm"); confirm != arguments.end()) {
         request["confirm"] =
             checked_number(confirm->second, "--confirm", {1, longest_confirmation});
+    }
     return request;
 }
 
@@ -179,18 +181,21 @@ json rollback_request(const Arguments &arguments)
 json diff_request(const Arguments &arguments)
 {
     json request = json::object();
-    if (const auto from = arguments.find("from"); from != arguments.end())
+    if (const auto from = arguments.find("from"); from != arguments.end()) {
         request["after"] = checked_number(from->second, "FROM");
-    if (const auto to = arguments.find("to"); to != arguments.end())
+    }
+    if (const auto to = arguments.find("to"); to != arguments.end()) {
         request["to"] = checked_number(to->second, "TO");
+    }
     return request;
 }
 
 json history_request(const Arguments &arguments)
 {
     const auto limit = arguments.find("limit");
-    if (limit == arguments.end())
+    if (limit == arguments.end()) {
         return json::object();
+    }
     return {{"limit", checked_number(limit->second, "--limit", {.first = 1})}};
 }
 
@@ -216,12 +221,14 @@ json show_tunnel_tables_request(const Arguments &)
 
 json show_tunnel_request(const Arguments &arguments)
 {
-    if (arguments.size() != 1)
+    if (arguments.size() != 1) {
         throw UsageError("give one of --name, --alias and --id");
+    }
     const auto &[key, value] = *arguments.begin();
     // A request has an "id" of its own.
-    if (key == "id")
+    if (key == "id") {
         return {{"what", "tunnel"}, {"tunnel_id", checked_number(value, "the ID")}};
+    }
     return {{"what", "tunnel"}, {key, checked_utf8(value, "the " + key)}};
 }
 

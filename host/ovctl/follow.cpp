@@ -25,8 +25,9 @@ namespace
 std::string text_of_event(const json &event, const Command &command, bool as_json,
                           std::ostream &out)
 {
-    if (as_json)
+    if (as_json) {
         return to_line(event);
+    }
     std::ostringstream text;
     set_terminal(text, terminal_of(out));
     command.render(event, text);
@@ -39,12 +40,14 @@ try {
     constexpr std::chrono::hours no_hurry(1);
     for (;;) {
         auto event = client.read_event(no_hurry);
-        if (event || client.is_woken())
+        if (event || client.is_woken()) {
             return event;
+        }
     }
 } catch (const ClientError &error) {
-    if (error.kind() != ClientError::Kind::stopping)
+    if (error.kind() != ClientError::Kind::stopping) {
         throw;
+    }
     return std::nullopt;
 }
 
@@ -54,8 +57,9 @@ try {
     (void)client.call(command.request, arguments);
     return true;
 } catch (const ClientError &) {
-    if (!client.is_woken())
+    if (!client.is_woken()) {
         throw;
+    }
     return false;
 }
 
@@ -75,11 +79,14 @@ ExitCode follow_events(ControlClient &client, const Command &command, const json
 {
     const SignalPipe stop;
     client.wake_on(stop.fd());
-    if (!is_answered(client, command, arguments))
+    if (!is_answered(client, command, arguments)) {
         return ExitCode::ok;
-    while (const std::optional<json> event = next_event(client))
-        if (!print(text_of_event(*event, command, as_json, out), stop.fd()))
+    }
+    while (const std::optional<json> event = next_event(client)) {
+        if (!print(text_of_event(*event, command, as_json, out), stop.fd())) {
             break;
+        }
+    }
     return ExitCode::ok;
 }
 

@@ -15,8 +15,9 @@ int main(int argc, char **argv)
     ovhost::set_terminal(std::cerr, ovhost::look_at_terminal(STDERR_FILENO));
     int exit_code = 0;
     const auto invocation = ovhost::read_command_line(argc, argv, std::cout, std::cerr, exit_code);
-    if (!invocation)
+    if (!invocation) {
         return exit_code;
+    }
     const ovhost::ExitCode code = ovhost::run_command(*invocation, std::cout, std::cerr);
     if (!std::cout.flush()) {
         std::cerr << "ovctl: cannot write to standard output\n";

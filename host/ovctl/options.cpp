@@ -30,8 +30,9 @@ constexpr const char *footer =
 
 std::string upper(std::string text)
 {
-    for (char &letter : text)
+    for (char &letter : text) {
         letter = static_cast<char>(std::toupper(static_cast<unsigned char>(letter)));
+    }
     return text;
 }
 
@@ -56,8 +57,9 @@ class CommandLine
         // Global options are taken after the command's name too.
         app_.fallthrough();
         add_global_options();
-        for (const Command &command : commands())
+        for (const Command &command : commands()) {
             add_command(command);
+        }
     }
 
     CLI::App &app() { return app_; }
@@ -66,8 +68,9 @@ class CommandLine
     [[nodiscard]] std::string unknown_command() const
     {
         const std::vector<std::string> rest = app_.remaining(true);
-        if (rest.empty() || rest.front().starts_with('-'))
+        if (rest.empty() || rest.front().starts_with('-')) {
             return {};
+        }
         const std::vector<CLI::App *> groups = app_.get_subcommands();
         return (groups.empty() ? "" : groups.front()->get_name() + " ") + rest.front();
     }
@@ -94,8 +97,9 @@ class CommandLine
         CLI::App &added = add_words(command.name);
         added.description(command.help);
         added.footer(std::string("Example:\n  ") + command.example);
-        for (const ArgumentSpec &argument : command.arguments)
+        for (const ArgumentSpec &argument : command.arguments) {
             add_argument(added, argument);
+        }
         added.callback([this, &command] { invocation_.command = &command; });
     }
 

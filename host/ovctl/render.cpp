@@ -24,9 +24,10 @@ std::string changes(long count)
 
 void print_warnings(const json &result, std::ostream &out)
 {
-    for (const json &warning : result.at("warnings"))
+    for (const json &warning : result.at("warnings")) {
         out << styled(out, Style::warning, "warning:") << ' '
             << printable(warning.get_ref<const std::string &>()) << '\n';
+    }
 }
 
 std::string yes_or_no(const json &object, const char *member)
@@ -48,8 +49,9 @@ std::string describe_peer(const json &peer)
 {
     std::string text = text_of(peer, "name") + " (pid " + std::to_string(count_of(peer, "pid")) +
                        ", " + counted(count_of(peer, "events_sent"), "event", "events") + " sent";
-    if (const long waiting = count_of(peer, "bytes_waiting"); waiting > 0)
+    if (const long waiting = count_of(peer, "bytes_waiting"); waiting > 0) {
         text += ", " + counted(waiting, "byte", "bytes") + " waiting";
+    }
     return text + ")";
 }
 
@@ -87,10 +89,11 @@ void print_change(const json &change, std::ostream &out)
 
 void print_commit(const json &result, long change_count, std::ostream &out)
 {
-    if (change_count == 0)
+    if (change_count == 0) {
         out << "nothing to commit\n";
-    else
+    } else {
         out << "commit " << count_of(result, "number") << ": " << changes(change_count) << '\n';
+    }
 }
 
 } // namespace
@@ -99,8 +102,9 @@ void render_nothing(const json &, std::ostream &) {}
 
 void render_nodes(const json &result, std::ostream &out)
 {
-    for (const json &node : result.at("nodes"))
+    for (const json &node : result.at("nodes")) {
         out << text_of(node, "name") << ' ' << type_and_value(node) << '\n';
+    }
 }
 
 void render_load(const json &result, std::ostream &out)
@@ -124,8 +128,9 @@ void render_commit(const json &result, std::ostream &out)
 
 void render_diff(const json &result, std::ostream &out)
 {
-    for (const json &change : result.at("changes"))
+    for (const json &change : result.at("changes")) {
         print_change(change, out);
+    }
 }
 
 void render_upgrade(const json &result, std::ostream &out)
@@ -154,8 +159,9 @@ void render_status(const json &result, std::ostream &out)
     print_fact(out, "running nodes", std::to_string(count_of(nodes, "running")));
     print_fact(out, "candidate nodes", std::to_string(count_of(nodes, "candidate")));
     print_fact(out, "candidate changes", std::to_string(count_of(result, "candidate_changes")));
-    for (const json &peer : result.at("peers"))
+    for (const json &peer : result.at("peers")) {
         print_fact(out, "peer", describe_peer(peer));
+    }
     render_wait(result, out);
 }
 

@@ -32,8 +32,9 @@ std::string time_of(const json &commit)
     std::tm local{};
     std::array<char, 64> text{};
     if (::localtime_r(&seconds, &local) == nullptr ||
-        std::strftime(text.data(), text.size(), "%Y-%m-%d %H:%M:%S", &local) == 0)
+        std::strftime(text.data(), text.size(), "%Y-%m-%d %H:%M:%S", &local) == 0) {
         return std::to_string(seconds);
+    }
     return text.data();
 }
 
@@ -41,8 +42,9 @@ std::string time_of(const json &commit)
 std::string state_of(const json &commit)
 {
     const json &confirmation = commit.at("confirmation");
-    if (confirmation.is_null())
+    if (confirmation.is_null()) {
         return {};
+    }
     const std::string by =
         confirmation.at("by").is_null() ? "" : " by " + number_of(confirmation, "by");
     return text_of(confirmation, "state") + by;
@@ -52,8 +54,9 @@ std::string remark_of(const json &commit)
 {
     const std::string state = state_of(commit);
     const std::string comment = text_of(commit, "comment");
-    if (state.empty())
+    if (state.empty()) {
         return comment.empty() ? "-" : comment;
+    }
     return "[" + state + "]" + (comment.empty() ? "" : " " + comment);
 }
 
@@ -75,8 +78,9 @@ std::string commits_of(const json &wait, const char *one, const char *several)
 
 void print_refusal(const json &object, std::ostream &out)
 {
-    if (!object.at("undo_refusal").is_null())
+    if (!object.at("undo_refusal").is_null()) {
         out << "the last try to undo failed: " << text_of(object, "undo_refusal") << '\n';
+    }
 }
 
 void print_stored_commit(const json &event, std::ostream &out)
@@ -85,14 +89,16 @@ void print_stored_commit(const json &event, std::ostream &out)
     out << styled(out, Style::heading, "commit " + number_of(commit, "number")) << " by "
         << text_of(commit.at("author"), "user") << " at " << time_of(commit) << ", "
         << counted(count_of(commit, "changes"), "change", "changes");
-    if (const std::string comment = text_of(commit, "comment"); !comment.empty())
+    if (const std::string comment = text_of(commit, "comment"); !comment.empty()) {
         out << ": " << comment;
+    }
     out << '\n';
-    if (event.at("changes").is_null())
+    if (event.at("changes").is_null()) {
         out << "too many changes to show here: run ovctl show commit "
             << number_of(commit, "number") << '\n';
-    else
+    } else {
         render_diff(event, out);
+    }
 }
 
 } // namespace
@@ -100,21 +106,24 @@ void print_stored_commit(const json &event, std::ostream &out)
 void render_event(const json &event, std::ostream &out)
 {
     const auto &kind = event.at("kind").get_ref<const std::string &>();
-    if (kind == "commit")
+    if (kind == "commit") {
         print_stored_commit(event, out);
-    else if (kind == "gap")
+    } else if (kind == "gap") {
         out << styled(out, Style::warning, "missed") << ' '
             << counted(count_of(event, "left_out"), "commit", "commits")
             << ", which came faster than they were read: run ovctl history\n";
+    }
 }
 
 void render_wait(const json &result, std::ostream &out)
 {
-    if (const auto confirmed = result.find("confirmed"); confirmed != result.end())
+    if (const auto confirmed = result.find("confirmed"); confirmed != result.end()) {
         out << commits_of(*confirmed, "is", "are") << " confirmed\n";
+    }
     const auto waits = result.find("waits");
-    if (waits == result.end() || waits->is_null())
+    if (waits == result.end() || waits->is_null()) {
         return;
+    }
     out << commits_of(*waits, "is", "are") << " undone in "
         << counted(count_of(*waits, "seconds_left"), "second", "seconds")
         << " unless confirmed: run ovctl confirm\n";
@@ -125,14 +134,16 @@ void render_history(const json &result, std::ostream &out)
 {
     const json &commits = result.at("commits");
     TableRows rows{{"COMMIT", "TIME", "AUTHOR", "CHANGES", "COMMENT"}};
-    for (const json &commit : commits)
+    for (const json &commit : commits) {
         rows.push_back({number_of(commit, "number"), time_of(commit),
                         text_of(commit.at("author"), "user"), number_of(commit, "changes"),
                         remark_of(commit)});
-    if (commits.empty())
+    }
+    if (commits.empty()) {
         out << "no commits\n";
-    else
+    } else {
         print_table(out, rows);
+    }
     render_wait(result, out);
 }
 
@@ -142,10 +153,12 @@ void render_recorded_commit(const json &result, std::ostream &out)
     print_fact(out, "commit", number_of(commit, "number"));
     print_fact(out, "time", time_of(commit));
     print_fact(out, "author", author_of(commit));
-    if (const std::string comment = text_of(commit, "comment"); !comment.empty())
+    if (const std::string comment = text_of(commit, "comment"); !comment.empty()) {
         print_fact(out, "comment", comment);
-    if (!commit.at("rollback_to").is_null())
+    }
+    if (!commit.at("rollback_to").is_null()) {
         print_fact(out, "back to commit", number_of(commit, "rollback_to"));
+    }
     if (const std::string state = state_of(commit); !state.empty()) {
         print_fact(out, "confirmation", state);
         print_refusal(commit.at("confirmation"), out);

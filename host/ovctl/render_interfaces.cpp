@@ -24,8 +24,9 @@ std::string enabled_of(const json &interface)
 std::string users_of(const json &interface)
 {
     std::string list;
-    for (const json &user : interface.at("users"))
+    for (const json &user : interface.at("users")) {
         list += (list.empty() ? "" : ", ") + text_of(user, "text");
+    }
     return list.empty() ? "-" : list;
 }
 
@@ -34,13 +35,15 @@ std::string users_of(const json &interface)
 void render_interfaces(const json &result, std::ostream &out)
 {
     TableRows rows{{"NAME", "KIND", "ENABLED", "USED BY"}};
-    for (const json &interface : result.at("interfaces"))
+    for (const json &interface : result.at("interfaces")) {
         rows.push_back({text_of(interface, "name"), text_of(interface, "kind"),
                         enabled_of(interface), users_of(interface)});
-    if (rows.size() == 1)
+    }
+    if (rows.size() == 1) {
         out << "no interfaces\n";
-    else
+    } else {
         print_table(out, rows);
+    }
 }
 
 void render_budget(const json &result, std::ostream &out)

@@ -41,11 +41,13 @@ std::string text_or(const json &object, const char *member, const char *otherwis
 void print_table(std::ostream &out, const TableRows &rows)
 {
     std::vector<Column> columns;
-    for (const std::string &heading : rows.front())
+    for (const std::string &heading : rows.front()) {
         columns.push_back({.heading = heading});
+    }
     Table table(std::move(columns));
-    for (auto row = rows.begin() + 1; row != rows.end(); ++row)
+    for (auto row = rows.begin() + 1; row != rows.end(); ++row) {
         table.add(*row);
+    }
     table.print(out);
 }
 

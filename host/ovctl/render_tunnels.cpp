@@ -38,8 +38,9 @@ void print_list(const json &tunnels, std::ostream &out)
     Table table({{.heading = "NAME"},
                  {.heading = "ID", .right = true, .min_width = 5},
                  {.heading = "ALIAS"}});
-    for (const json &tunnel : tunnels)
+    for (const json &tunnel : tunnels) {
         table.add({text_of(tunnel, "name"), id_of(tunnel), alias_of(tunnel)});
+    }
     table.print(out);
 }
 
@@ -52,8 +53,9 @@ void print_table_fact(std::ostream &out, const char *name, const json &result, c
 
 std::string held_back(const json &held)
 {
-    if (held.empty())
+    if (held.empty()) {
         return "0";
+    }
     const json &first = held.front();
     return std::to_string(held.size()) + ", the first (ID " +
            std::to_string(count_of(first, "id")) + ") for " +
@@ -65,10 +67,11 @@ std::string held_back(const json &held)
 void render_tunnels(const json &result, std::ostream &out)
 {
     const json &tunnels = result.at("tunnels");
-    if (tunnels.empty())
+    if (tunnels.empty()) {
         out << "no tunnels\n";
-    else
+    } else {
         print_list(tunnels, out);
+    }
 }
 
 void render_tunnel(const json &result, std::ostream &out)

@@ -29,20 +29,23 @@ struct Failure {
 
 Failure failure_of(ClientError::Kind kind)
 {
-    if (kind == ClientError::Kind::protocol)
+    if (kind == ClientError::Kind::protocol) {
         return {ExitCode::protocol, "protocol"};
-    if (kind == ClientError::Kind::timeout)
+    }
+    if (kind == ClientError::Kind::timeout) {
         return {ExitCode::unreachable, "timeout"};
+    }
     return {ExitCode::unreachable, "unreachable"};
 }
 
 ExitCode report(const Failure &failure, const std::string &message, const Options &options,
                 std::ostream &out, std::ostream &err)
 {
-    if (options.json)
+    if (options.json) {
         render_error_json(RequestError(failure.code, message), out);
-    else
+    } else {
         err << styled(err, Style::error, "ovctl:") << ' ' << message << '\n';
+    }
     return failure.exit;
 }
 
@@ -50,8 +53,9 @@ ExitCode report(const Failure &failure, const std::string &message, const Option
 std::string file_of(const Invocation &invocation)
 {
     const auto file = invocation.arguments.find("file");
-    if (file == invocation.arguments.end())
+    if (file == invocation.arguments.end()) {
         return {};
+    }
     return file->second == "-" ? "standard input" : file->second;
 }
 
@@ -61,8 +65,9 @@ json call_mgmtd(ControlClient &client, const Invocation &invocation, const json 
     const char *const request = invocation.command->request;
     const std::string file = file_of(invocation);
     // Other requests are short.
-    if (file.empty())
+    if (file.empty()) {
         return client.call(request, arguments);
+    }
     ProgressLine line(err, file);
     client.on_progress([&line](const CallProgress &progress) { line.update(progress); });
     json result = client.call(request, arguments);
@@ -77,13 +82,15 @@ ExitCode ask_and_print(const Invocation &invocation, std::ostream &out, std::ost
     const std::chrono::duration<double> patience(invocation.options.timeout_seconds);
     ControlClient client(invocation.options.socket,
                          std::chrono::ceil<std::chrono::milliseconds>(patience));
-    if (command.follows)
+    if (command.follows) {
         return follow_events(client, command, arguments, invocation.options.json, out);
+    }
     const json result = call_mgmtd(client, invocation, arguments, err);
-    if (invocation.options.json)
+    if (invocation.options.json) {
         out << to_line({{"ok", true}, {"result", result}});
-    else
+    } else {
         command.render(result, out);
+    }
     return command.is_bad != nullptr && command.is_bad(result) ? ExitCode::refused : ExitCode::ok;
 }
 
@@ -107,10 +114,11 @@ ExitCode run_command(const Invocation &invocation, std::ostream &out, std::ostre
     try {
         return ask_and_print(invocation, out, err);
     } catch (const RequestError &refusal) {
-        if (options.json)
+        if (options.json) {
             render_error_json(refusal, out);
-        else
+        } else {
             render_refusal(refusal, subject_of(invocation), err);
+        }
         return ExitCode::refused;
     } catch (const ClientError &error) {
         return fail(failure_of(error.kind()), error.what());

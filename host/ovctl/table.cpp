@@ -25,8 +25,9 @@ void fit(std::vector<std::size_t> &widths, std::size_t available)
     std::size_t needed = std::accumulate(widths.begin(), widths.end(), gap * (widths.size() - 1));
     while (needed > available) {
         const auto widest = std::ranges::max_element(widths);
-        if (*widest <= narrowest)
+        if (*widest <= narrowest) {
             return;
+        }
         --*widest;
         --needed;
     }
@@ -37,11 +38,14 @@ void fit(std::vector<std::size_t> &widths, std::size_t available)
 std::vector<std::size_t> Table::natural_widths() const
 {
     std::vector<std::size_t> widths;
-    for (const Column &column : columns_)
+    for (const Column &column : columns_) {
         widths.push_back(std::max(width_of(column.heading), column.min_width));
-    for (const std::vector<std::string> &row : rows_)
-        for (std::size_t i = 0; i < row.size(); ++i)
+    }
+    for (const std::vector<std::string> &row : rows_) {
+        for (std::size_t i = 0; i < row.size(); ++i) {
             widths[i] = std::max(widths[i], width_of(row[i]));
+        }
+    }
     return widths;
 }
 
@@ -53,10 +57,11 @@ std::string Table::line_of(const std::vector<std::string> &cells,
         const std::string cell = fitted(cells[i], widths[i]);
         const std::string blanks(widths[i] - std::min(widths[i], width_of(cell)), ' ');
         const bool last = i + 1 == cells.size();
-        if (columns_[i].right)
+        if (columns_[i].right) {
             line += blanks + cell;
-        else
+        } else {
             line += last ? cell : cell + blanks;
+        }
         line.append(last ? 0 : gap, ' ');
     }
     return line;
@@ -65,14 +70,17 @@ std::string Table::line_of(const std::vector<std::string> &cells,
 void Table::print(std::ostream &out) const
 {
     std::vector<std::size_t> widths = natural_widths();
-    if (const std::size_t width = terminal_of(out).width; width > 0)
+    if (const std::size_t width = terminal_of(out).width; width > 0) {
         fit(widths, width);
+    }
     std::vector<std::string> headings;
-    for (const Column &column : columns_)
+    for (const Column &column : columns_) {
         headings.push_back(column.heading);
+    }
     out << styled(out, Style::heading, line_of(headings, widths)) << '\n';
-    for (const std::vector<std::string> &row : rows_)
+    for (const std::vector<std::string> &row : rows_) {
         out << line_of(row, widths) << '\n';
+    }
 }
 
 } // namespace ovhost

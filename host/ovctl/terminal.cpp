@@ -77,8 +77,9 @@ int colour_slot()
 
 Terminal look_at_terminal(int fd)
 {
-    if (::isatty(fd) != 1)
+    if (::isatty(fd) != 1) {
         return {};
+    }
     const auto given = width_by_environment();
     return {.width = given ? *given : width_by_terminal(fd), .colour = shows_colour()};
 }
@@ -97,8 +98,9 @@ Terminal terminal_of(std::ostream &stream)
 
 std::string styled(std::ostream &stream, Style style, const std::string &text)
 {
-    if (!terminal_of(stream).colour)
+    if (!terminal_of(stream).colour) {
         return text;
+    }
     return beginnings[static_cast<std::size_t>(style)] + text + end_of_style;
 }
 

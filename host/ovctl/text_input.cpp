@@ -23,8 +23,9 @@ std::optional<std::size_t> first_fault(std::string_view text)
 {
     for (std::size_t at = 0; at < text.size();) {
         const std::size_t length = utf8_character_length(text.substr(at));
-        if (length == 0)
+        if (length == 0) {
             return at;
+        }
         at += length;
     }
     return std::nullopt;
@@ -43,8 +44,9 @@ constexpr std::size_t longest_mib = 16;
 std::string checked_utf8(std::string text, const std::string &what)
 {
     const auto fault = first_fault(text);
-    if (!fault)
+    if (!fault) {
         return text;
+    }
     const auto line =
         1 + std::count(text.begin(), text.begin() + static_cast<std::ptrdiff_t>(*fault), '\n');
     throw UsageError(what + " is not UTF-8 in line " + std::to_string(line) + ": convert it first");
@@ -57,23 +59,26 @@ std::uint32_t checked_number(const std::string &text, const std::string &what,
     const char *const text_end = text.data() + text.size();
     const auto [end, fault] = std::from_chars(text.data(), text_end, number);
     const bool is_number = fault == std::errc() && end == text_end;
-    if (!is_number || number < range.first || number > range.last)
+    if (!is_number || number < range.first || number > range.last) {
         throw UsageError(what + " must be a whole number from " + std::to_string(range.first) +
                          " to " + std::to_string(range.last));
+    }
     return number;
 }
 
 std::string read_text(const std::string &file)
 {
-    if (file.empty())
+    if (file.empty()) {
         throw UsageError("the name of the file is empty; - is standard input");
+    }
     const bool standard_input = file == "-";
     const std::string what = standard_input ? "standard input" : file;
     UniqueFd opened;
     if (!standard_input) {
         opened = UniqueFd(::open(file.c_str(), O_RDONLY | O_CLOEXEC));
-        if (!opened)
+        if (!opened) {
             fail_to_read(what, {errno, std::generic_category()});
+        }
     }
     constexpr std::size_t longest = longest_mib << 20;
     std::string text;
@@ -82,9 +87,10 @@ std::string read_text(const std::string &file)
     } catch (const std::system_error &error) {
         fail_to_read(what, error.code());
     }
-    if (text.size() > longest)
+    if (text.size() > longest) {
         throw UsageError(what + " is longer than " + std::to_string(longest_mib) +
                          " MiB: load it in smaller parts");
+    }
     return checked_utf8(std::move(text), what);
 }
 

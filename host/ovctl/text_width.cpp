@@ -19,13 +19,15 @@ class Utf8Locale
   public:
     Utf8Locale() : locale_(::newlocale(LC_CTYPE_MASK, "C.UTF-8", nullptr))
     {
-        if (locale_ != nullptr)
+        if (locale_ != nullptr) {
             before_ = ::uselocale(locale_);
+        }
     }
     ~Utf8Locale()
     {
-        if (locale_ == nullptr)
+        if (locale_ == nullptr) {
             return;
+        }
         ::uselocale(before_);
         ::freelocale(locale_);
     }
@@ -47,8 +49,9 @@ Character first_character(std::string_view text)
     const std::size_t bytes = std::max<std::size_t>(utf8_character_length(text), 1);
     wchar_t character = 0;
     std::mbstate_t state{};
-    if (std::mbrtowc(&character, text.data(), bytes, &state) != bytes)
+    if (std::mbrtowc(&character, text.data(), bytes, &state) != bytes) {
         return {bytes, 1};
+    }
     // Unassigned ones have no width; terminals show something for them.
     const int width = ::wcwidth(character);
     return {bytes, width < 0 ? 1 : static_cast<std::size_t>(width)};
@@ -61,8 +64,9 @@ std::size_t bytes_within(std::string_view text, std::size_t width)
     std::size_t bytes = 0;
     while (bytes < text.size()) {
         const Character next = first_character(text.substr(bytes));
-        if (next.width > width)
+        if (next.width > width) {
             break;
+        }
         width -= next.width;
         bytes += next.bytes;
     }
@@ -85,8 +89,9 @@ std::size_t width_of(std::string_view text)
 
 std::string fitted(std::string_view text, std::size_t width)
 {
-    if (bytes_within(text, width) == text.size())
+    if (bytes_within(text, width) == text.size()) {
         return std::string(text);
+    }
     const std::size_t bytes = width == 0 ? 0 : bytes_within(text, width - 1);
     return std::string(text.substr(0, bytes)) + (width == 0 ? "" : "…");
 }

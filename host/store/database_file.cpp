@@ -93,8 +93,9 @@ UniqueFd open_regular(const fs::path &file)
                       S_ISDIR(about.st_mode) ? "it is a directory" : "it is not a regular file");
     }
     UniqueFd opened(::open(file.c_str(), O_RDWR | O_CLOEXEC));
-    if (!opened)
+    if (!opened) {
         throw_system("open " + file.string(), errno, kPermissionAdvice);
+    }
     return opened;
 }
 
@@ -106,10 +107,12 @@ void close_to_others(const fs::path &file)
         const fs::path path = file.string() + side;
         struct stat about {
         };
-        if (::stat(path.c_str(), &about) != 0 || (about.st_mode & 07777U) == 0600)
+        if (::stat(path.c_str(), &about) != 0 || (about.st_mode & 07777U) == 0600) {
             continue;
-        if (::chmod(path.c_str(), 0600) != 0)
+        }
+        if (::chmod(path.c_str(), 0600) != 0) {
             throw_system("give " + path.string() + " mode 0600", errno, kPermissionAdvice);
+        }
     }
 }
 
@@ -121,16 +124,19 @@ void check_header(const fs::path &file)
     const UniqueFd opened = open_regular(file);
     std::array<char, kHeaderSize> bytes{};
     const ssize_t got = ::pread(opened.get(), bytes.data(), bytes.size(), 0);
-    if (got < 0)
+    if (got < 0) {
         throw_system("read " + file.string(), errno, kPermissionAdvice);
+    }
     const std::string_view header(bytes.data(), static_cast<std::size_t>(got));
-    if (header.empty())
+    if (header.empty()) {
         throw_damaged(file, "it is empty");
+    }
     if (!header.starts_with(kMagic.substr(0, header.size()))) {
         throw_foreign(file, "it does not begin like an SQLite database");
     }
-    if (header.size() < kHeaderSize)
+    if (header.size() < kHeaderSize) {
         throw_damaged(file, "it ends within its header");
+    }
     if (big_endian(header.substr(kApplicationIdOffset)) != kApplicationId) {
         throw_foreign(file, "it belongs to another program");
     }
@@ -139,10 +145,12 @@ void check_header(const fs::path &file)
 void check_version(const SqliteConnection &db, const fs::path &file)
 {
     const std::int64_t version = db.integer("PRAGMA user_version");
-    if (version < 0)
+    if (version < 0) {
         throw_damaged(file, "its version is " + std::to_string(version));
-    if (version <= schema_version())
+    }
+    if (version <= schema_version()) {
         return;
+    }
     throw StoreError("the configuration database " + file.string() +
                      " was written by a newer version of this program (its schema is version " +
                      std::to_string(version) + ", this program knows up to " +
@@ -169,8 +177,9 @@ void check_history(const SqliteConnection &db, const fs::path &file)
 void check_content(const SqliteConnection &db, const fs::path &file)
 {
     const std::string verdict = db.text("PRAGMA quick_check(1)");
-    if (verdict != "ok")
+    if (verdict != "ok") {
         throw_damaged(file, verdict);
+    }
     const std::int64_t version = db.integer("PRAGMA user_version");
     if (schema_of(db) != expected_schema(version)) {
         throw_foreign(file, "its tables are not this program's");
@@ -178,8 +187,9 @@ void check_content(const SqliteConnection &db, const fs::path &file)
     if (db.integer("SELECT count(*) FROM meta") != 1) {
         throw_damaged(file, "its commit number is missing");
     }
-    if (version >= kHistoryVersion)
+    if (version >= kHistoryVersion) {
         check_history(db, file);
+    }
 }
 
 // Every commit is on the disk before it is acknowledged. No other process is to read or write
@@ -195,14 +205,16 @@ SqliteConnection connect(const fs::path &file)
 void use_log(const SqliteConnection &db)
 {
     const std::string mode = db.text("PRAGMA journal_mode = WAL");
-    if (mode != "wal")
+    if (mode != "wal") {
         throw SqliteError(SQLITE_ERROR, "it stays in journal mode " + mode);
+    }
 }
 
 void remove_file(const fs::path &file)
 {
-    if (::unlink(file.c_str()) == 0 || errno == ENOENT)
+    if (::unlink(file.c_str()) == 0 || errno == ENOENT) {
         return;
+    }
     throw_system("remove " + file.string(), errno, "; remove it");
 }
 
@@ -217,8 +229,9 @@ void sync_directory(const fs::path &dir)
 void write_new_database(const fs::path &file)
 {
     const UniqueFd made(::open(file.c_str(), O_RDWR | O_CREAT | O_EXCL | O_CLOEXEC, 0600));
-    if (!made)
+    if (!made) {
         throw_system("make " + file.string(), errno, kPermissionAdvice);
+    }
     {
         SqliteConnection db = connect(file);
         use_log(db);
@@ -237,8 +250,9 @@ void check_no_orphaned_log(const fs::path &file)
     const fs::path log = file.string() + "-wal";
     struct stat about {
     };
-    if (::stat(log.c_str(), &about) != 0 || about.st_size == 0)
+    if (::stat(log.c_str(), &about) != 0 || about.st_size == 0) {
         return;
+    }
     throw StoreError("the configuration database " + file.string() + " is missing but its log " +
                      log.string() +
                      " is there; put the database back, or move the log away to"
@@ -250,8 +264,9 @@ void create_database(const fs::path &file)
 {
     check_no_orphaned_log(file);
     const fs::path unfinished = file.string() + ".new";
-    for (const char *side : {"", "-wal", "-journal"})
+    for (const char *side : {"", "-wal", "-journal"}) {
         remove_file(unfinished.string() + side);
+    }
     write_new_database(unfinished);
     if (::renameat2(AT_FDCWD, unfinished.c_str(), AT_FDCWD, file.c_str(), RENAME_NOREPLACE) != 0) {
         throw_system("name the new database " + file.string(), errno,
@@ -271,8 +286,9 @@ bool is_missing(const fs::path &file)
 
 SqliteConnection open_database(const fs::path &file)
 try {
-    if (is_missing(file))
+    if (is_missing(file)) {
         create_database(file);
+    }
     check_header(file);
     SqliteConnection db = connect(file);
     check_version(db, file);

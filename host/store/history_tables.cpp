@@ -39,8 +39,9 @@ std::uint64_t unsigned_at(const Statement &row, int column)
 template <typename Number>
 std::optional<Number> number_or_none(const Statement &row, int column)
 {
-    if (row.is_null(column))
+    if (row.is_null(column)) {
         return std::nullopt;
+    }
     return static_cast<Number>(row.integer(column));
 }
 
@@ -48,22 +49,25 @@ std::optional<Number> number_or_none(const Statement &row, int column)
 template <typename Number>
 void bind_if_any(Statement &statement, int parameter, const std::optional<Number> &number)
 {
-    if (number)
+    if (number) {
         statement.bind(parameter, static_cast<std::int64_t>(*number));
+    }
 }
 
 void bind_value(Statement &statement, int parameter, const std::optional<StoredValue> &value)
 {
-    if (!value)
+    if (!value) {
         return;
+    }
     statement.bind(parameter, std::int64_t{value->type});
     statement.bind(parameter + 1, value->text);
 }
 
 std::optional<StoredValue> value_at(const Statement &row, int column)
 {
-    if (row.is_null(column))
+    if (row.is_null(column)) {
         return std::nullopt;
+    }
     return StoredValue{static_cast<std::uint32_t>(row.integer(column)), row.text(column + 1)};
 }
 
@@ -116,8 +120,9 @@ void HistoryTables::record(const StoredChange &change)
     const std::optional<StoredValue> before =
         read_old_.step() ? value_at(read_old_, 0) : std::nullopt;
     read_old_.reset();
-    if (!before && !change.after)
+    if (!before && !change.after) {
         return;
+    }
     add_change_.bind(1, signed_of(number_));
     add_change_.bind(2, signed_of(changes_));
     add_change_.bind(3, change.name);
@@ -145,8 +150,9 @@ void HistoryTables::finish(const CommitNote &note)
 void HistoryTables::end_wait(const std::optional<Wait> &wait, Confirmation as,
                              std::optional<std::uint64_t> by)
 {
-    if (!wait)
+    if (!wait) {
         return;
+    }
     Statement mark = db_.prepare("UPDATE commits SET confirmation = ?1, ended_by = ?2"
                                  " WHERE number > ?3 AND number <= ?4");
     mark.bind(1, word_of(as));
@@ -184,8 +190,9 @@ void HistoryTables::note_refusal(const Wait &wait, const std::string &why)
 
 bool HistoryTables::is_over(std::uint64_t oldest) const
 {
-    if (number_ - oldest >= bounds_.commits)
+    if (number_ - oldest >= bounds_.commits) {
         return true;
+    }
     return static_cast<std::uint64_t>(db_.integer("SELECT sum(bytes) FROM commits")) >
            bounds_.bytes;
 }
@@ -203,15 +210,17 @@ void HistoryTables::prune(std::uint64_t keep_after)
 
 void HistoryTables::reset() noexcept
 {
-    for (Statement *statement : {&read_old_, &add_change_, &add_commit_})
+    for (Statement *statement : {&read_old_, &add_change_, &add_commit_}) {
         statement->reset();
+    }
 }
 
 std::optional<Wait> HistoryTables::wait() const
 {
     Statement query = db_.prepare("SELECT number, back_to, deadline, seconds FROM wait");
-    if (!query.step())
+    if (!query.step()) {
         return std::nullopt;
+    }
     return Wait{unsigned_at(query, 0), unsigned_at(query, 1), query.integer(2),
                 static_cast<std::uint32_t>(query.integer(3))};
 }
@@ -221,8 +230,9 @@ std::vector<RecordedCommit> HistoryTables::newest(std::uint64_t limit) const
     Statement query = db_.prepare(std::string(kCommitColumns) + "ORDER BY number DESC LIMIT ?1");
     query.bind(1, signed_of(limit));
     std::vector<RecordedCommit> commits;
-    while (query.step())
+    while (query.step()) {
         commits.push_back(commit_of(query));
+    }
     return commits;
 }
 
@@ -230,8 +240,9 @@ std::optional<RecordedCommit> HistoryTables::find(std::uint64_t number) const
 {
     Statement query = db_.prepare(std::string(kCommitColumns) + "WHERE number = ?1");
     query.bind(1, signed_of(number));
-    if (!query.step())
+    if (!query.step()) {
         return std::nullopt;
+    }
     return commit_of(query);
 }
 
@@ -246,8 +257,9 @@ std::vector<RecordedChange> HistoryTables::changes_of(std::uint64_t number) cons
                                   " FROM changes WHERE number = ?1 ORDER BY position");
     query.bind(1, signed_of(number));
     std::vector<RecordedChange> changes;
-    while (query.step())
+    while (query.step()) {
         changes.push_back(change_of(query));
+    }
     return changes;
 }
 
@@ -258,8 +270,9 @@ void HistoryTables::visit_back_to(std::uint64_t number,
                                   " FROM changes WHERE number > ?1"
                                   " ORDER BY number DESC, position DESC");
     query.bind(1, signed_of(number));
-    while (query.step())
+    while (query.step()) {
         take(change_of(query));
+    }
 }
 
 } // namespace ovhost

@@ -73,8 +73,9 @@ std::int64_t schema_version() noexcept
 void upgrade_schema(const SqliteConnection &db)
 {
     const std::int64_t version = db.integer("PRAGMA user_version");
-    if (version == schema_version())
+    if (version == schema_version()) {
         return;
+    }
     db.execute("BEGIN IMMEDIATE");
     run_steps(db, version, schema_version());
     db.execute("PRAGMA application_id = " + std::to_string(kApplicationId));
@@ -89,8 +90,9 @@ std::vector<std::string> schema_of(const SqliteConnection &db)
         db.prepare("SELECT type || ' ' || name || ': ' || coalesce(sql, '') FROM sqlite_schema"
                    " WHERE name NOT LIKE 'sqlite\\_%' ESCAPE '\\' ORDER BY name");
     std::vector<std::string> entries;
-    while (query.step())
+    while (query.step()) {
         entries.push_back(query.text(0));
+    }
     return entries;
 }
 

@@ -21,8 +21,9 @@ namespace
     const int cause = kept != 0 ? kept : left;
     const bool from_system = code == SQLITE_IOERR || code == SQLITE_FULL || code == SQLITE_CANTOPEN;
     std::string what = sqlite3_errmsg(db);
-    if (from_system && cause != 0)
+    if (from_system && cause != 0) {
         what += " (" + system_message(cause) + ")";
+    }
     throw SqliteError(code, what);
 }
 
@@ -47,15 +48,17 @@ Statement::Statement(sqlite3 *db, std::string_view sql)
     sqlite3_stmt *statement = nullptr;
     const int status = sqlite3_prepare_v3(db, sql.data(), static_cast<int>(sql.size()),
                                           SQLITE_PREPARE_PERSISTENT, &statement, nullptr);
-    if (status != SQLITE_OK)
+    if (status != SQLITE_OK) {
         throw_last_error(db);
+    }
     statement_.reset(statement);
 }
 
 void Statement::check(int status) const
 {
-    if (status != SQLITE_OK)
+    if (status != SQLITE_OK) {
         throw_last_error(sqlite3_db_handle(statement_.get()));
+    }
 }
 
 void Statement::bind(int parameter, std::int64_t value)
@@ -75,10 +78,12 @@ bool Statement::step()
 {
     errno = 0;
     const int status = sqlite3_step(statement_.get());
-    if (status == SQLITE_ROW)
+    if (status == SQLITE_ROW) {
         return true;
-    if (status == SQLITE_DONE)
+    }
+    if (status == SQLITE_DONE) {
         return false;
+    }
     throw_last_error(sqlite3_db_handle(statement_.get()));
 }
 
@@ -105,8 +110,9 @@ std::string Statement::text(int column) const
 {
     const void *bytes = sqlite3_column_text(statement_.get(), column);
     const int size = sqlite3_column_bytes(statement_.get(), column);
-    if (bytes == nullptr)
+    if (bytes == nullptr) {
         return {};
+    }
     return {static_cast<const char *>(bytes), static_cast<std::size_t>(size)};
 }
 
@@ -132,10 +138,12 @@ SqliteConnection::SqliteConnection(const std::string &name, int flags)
     sqlite3 *db = nullptr;
     const int status = sqlite3_open_v2(name.c_str(), &db, flags, nullptr);
     db_.reset(db);
-    if (db == nullptr)
+    if (db == nullptr) {
         throw SqliteError(status, sqlite3_errstr(status));
-    if (status != SQLITE_OK)
+    }
+    if (status != SQLITE_OK) {
         throw_last_error(db);
+    }
 }
 
 SqliteConnection SqliteConnection::in_memory()

@@ -18,13 +18,15 @@ namespace
 
 void make_directory(const std::filesystem::path &dir)
 {
-    if (::mkdir(dir.c_str(), 0700) == 0 || errno == EEXIST)
+    if (::mkdir(dir.c_str(), 0700) == 0 || errno == EEXIST) {
         return;
+    }
     const int cause = errno;
     const std::string what =
         "cannot make the state directory " + dir.string() + ": " + system_message(cause);
-    if (cause == ENOENT)
+    if (cause == ENOENT) {
         throw StoreError(what + "; make its parent directory first");
+    }
     throw StoreError(what + advice_for(cause, "; make it, or choose another state directory"));
 }
 
@@ -36,8 +38,9 @@ void check_directory(const std::filesystem::path &dir)
         throw StoreError("the state directory " + dir.string() +
                          " is not a directory; move it away, or choose another state directory");
     }
-    if (::faccessat(AT_FDCWD, dir.c_str(), R_OK | W_OK | X_OK, AT_EACCESS) == 0)
+    if (::faccessat(AT_FDCWD, dir.c_str(), R_OK | W_OK | X_OK, AT_EACCESS) == 0) {
         return;
+    }
     throw StoreError("the state directory " + dir.string() +
                      " cannot be written: " + system_message(errno) +
                      "; give this user write permission, or choose another state directory");
@@ -50,8 +53,9 @@ bool holds_only_state(const std::filesystem::path &dir)
     std::filesystem::directory_iterator entries(dir, fault);
     for (; !fault && entries != std::filesystem::directory_iterator(); entries.increment(fault)) {
         const std::string name = entries->path().filename().string();
-        if (name != "lock" && !name.starts_with("config.db"))
+        if (name != "lock" && !name.starts_with("config.db")) {
             return false;
+        }
     }
     return !fault;
 }
@@ -62,19 +66,23 @@ void close_to_others(const std::filesystem::path &dir)
 {
     struct stat about {
     };
-    if (::stat(dir.c_str(), &about) != 0)
+    if (::stat(dir.c_str(), &about) != 0) {
         return;
+    }
     if (about.st_uid != ::geteuid() && about.st_uid != 0) {
         throw StoreError("the state directory " + dir.string() + " belongs to another user (uid " +
                          std::to_string(about.st_uid) +
                          "); make it this user's, or choose another state directory");
     }
-    if ((about.st_mode & 077U) == 0)
+    if ((about.st_mode & 077U) == 0) {
         return;
-    if (holds_only_state(dir) && ::chmod(dir.c_str(), 0700) == 0)
+    }
+    if (holds_only_state(dir) && ::chmod(dir.c_str(), 0700) == 0) {
         return;
-    if ((about.st_mode & 022U) == 0)
+    }
+    if ((about.st_mode & 022U) == 0) {
         return;
+    }
     throw StoreError("other users can write the state directory " + dir.string() +
                      "; give it mode 0700, or choose another state directory");
 }
@@ -83,8 +91,9 @@ UniqueFd open_lock(const std::filesystem::path &file)
 {
     UniqueFd lock(
         ::open(file.c_str(), O_RDWR | O_CREAT | O_CLOEXEC | O_NOFOLLOW | O_NONBLOCK, 0600));
-    if (lock)
+    if (lock) {
         return lock;
+    }
     const int cause = errno;
     throw StoreError(
         "cannot open the lock file " + file.string() + ": " + system_message(cause) +
@@ -97,8 +106,9 @@ std::string read_holder(int lock)
 {
     std::array<char, 24> digits{};
     const ssize_t size = ::pread(lock, digits.data(), digits.size(), 0);
-    if (size <= 0)
+    if (size <= 0) {
         return {};
+    }
     const std::string text(digits.data(), static_cast<std::size_t>(size));
     const std::size_t end = text.find_first_not_of("0123456789");
     return end != std::string::npos && text.substr(end) == "\n" ? text.substr(0, end) : "";
@@ -108,8 +118,9 @@ std::string read_holder(int lock)
 void write_holder(int lock)
 {
     const std::string text = std::to_string(::getpid()) + "\n";
-    if (::ftruncate(lock, 0) != 0)
+    if (::ftruncate(lock, 0) != 0) {
         return;
+    }
     [[maybe_unused]] const ssize_t written = ::pwrite(lock, text.data(), text.size(), 0);
 }
 

@@ -95,11 +95,13 @@ void Store::Parts::write(std::span<const StoredChange> changes, const CommitNote
 
 void Store::Parts::undo() noexcept
 try {
-    for (Statement *statement : {&begin, &put, &remove, &count, &end})
+    for (Statement *statement : {&begin, &put, &remove, &count, &end}) {
         statement->reset();
+    }
     history.reset();
-    if (db.in_transaction())
+    if (db.in_transaction()) {
         db.execute("ROLLBACK");
+    }
     // When the very last step failed, the log already holds the whole transaction, and a crash
     // from here on would bring it back: empty the log.
     db.execute("PRAGMA wal_checkpoint(TRUNCATE)");
@@ -209,8 +211,9 @@ void Store::end_wait(Confirmation as)
 
 void Store::prolong_wait(std::int64_t now, std::uint32_t seconds)
 {
-    if (!parts_->wait)
+    if (!parts_->wait) {
         return;
+    }
     const Wait next{parts_->wait->number, parts_->wait->back_to, now + seconds, seconds};
     parts_->transact("store the new time for a confirmation",
                      [&] { parts_->history.begin_wait(next); });
@@ -219,8 +222,9 @@ void Store::prolong_wait(std::int64_t now, std::uint32_t seconds)
 
 void Store::note_undo_refusal(const std::string &why)
 {
-    if (!parts_->wait)
+    if (!parts_->wait) {
         return;
+    }
     parts_->transact("record the refusal of an undo",
                      [&] { parts_->history.note_refusal(*parts_->wait, why); });
 }

@@ -32,11 +32,13 @@ constexpr Range invisible[] = {
 std::uint32_t code_point(std::string_view character)
 {
     const auto lead = static_cast<unsigned char>(character.front());
-    if (character.size() == 1)
+    if (character.size() == 1) {
         return lead;
+    }
     std::uint32_t code = lead & (0xffU >> (character.size() + 1));
-    for (const char next : character.substr(1))
+    for (const char next : character.substr(1)) {
         code = code << 6 | (static_cast<unsigned char>(next) & 0x3fU);
+    }
     return code;
 }
 
@@ -82,10 +84,11 @@ std::string printable(std::string_view text)
         const std::size_t length = utf8_character_length(text);
         const std::string_view character = text.substr(0, std::max<std::size_t>(length, 1));
         const std::uint32_t code = code_point(character);
-        if (length == 0)
+        if (length == 0) {
             result += byte_escape(code);
-        else
+        } else {
             result += is_invisible(code) ? escaped(code) : std::string(character);
+        }
         text.remove_prefix(character.size());
     }
     return result;

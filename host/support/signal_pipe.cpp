@@ -29,19 +29,22 @@ void on_signal(int)
 SignalPipe::SignalPipe()
 {
     int ends[2];
-    if (::pipe2(ends, O_CLOEXEC | O_NONBLOCK) != 0)
+    if (::pipe2(ends, O_CLOEXEC | O_NONBLOCK) != 0) {
         throw std::system_error(errno, std::generic_category(), "cannot create a pipe");
+    }
     read_end_ = UniqueFd(ends[0]);
     write_end_ = UniqueFd(ends[1]);
     pipe_of_handler = ends[1];
-    for (const int number : {SIGTERM, SIGINT})
+    for (const int number : {SIGTERM, SIGINT}) {
         std::signal(number, on_signal);
+    }
 }
 
 SignalPipe::~SignalPipe()
 {
-    for (const int number : {SIGTERM, SIGINT})
+    for (const int number : {SIGTERM, SIGINT}) {
         std::signal(number, SIG_DFL);
+    }
     pipe_of_handler = -1;
 }
 

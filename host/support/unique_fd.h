@@ -23,8 +23,9 @@ class UniqueFd
     UniqueFd &operator=(const UniqueFd &) = delete;
     ~UniqueFd()
     {
-        if (fd_ >= 0)
+        if (fd_ >= 0) {
             ::close(fd_);
+        }
     }
 
     [[nodiscard]] int get() const noexcept { return fd_; }

@@ -18,8 +18,9 @@ void with_room(LookUp look_up)
 {
     constexpr std::size_t largest = 1UL << 20;
     std::vector<char> texts(1024);
-    while (look_up(texts) == ERANGE && texts.size() < largest)
+    while (look_up(texts) == ERANGE && texts.size() < largest) {
         texts.resize(texts.size() * 2);
+    }
 }
 
 } // namespace
@@ -31,8 +32,9 @@ std::string user_name(uid_t user)
         passwd entry{};
         passwd *found = nullptr;
         const int error = ::getpwuid_r(user, &entry, texts.data(), texts.size(), &found);
-        if (found != nullptr)
+        if (found != nullptr) {
             name = found->pw_name;
+        }
         return error;
     });
     return name;
@@ -45,8 +47,9 @@ std::optional<gid_t> find_group(const std::string &name)
         group entry{};
         group *found = nullptr;
         const int error = ::getgrnam_r(name.c_str(), &entry, texts.data(), texts.size(), &found);
-        if (found != nullptr)
+        if (found != nullptr) {
             number = found->gr_gid;
+        }
         return error;
     });
     return number;
