@@ -1,5 +1,7 @@
 #include "host/mgmtd/private_root.h"
 
+#include "host/support/unique_fd.h"
+
 #include <fcntl.h>
 #include <linux/capability.h>
 #include <sched.h>
@@ -14,8 +16,6 @@
 #include <string>
 #include <system_error>
 #include <vector>
-
-#include "host/support/unique_fd.h"
 
 namespace ovhost
 {

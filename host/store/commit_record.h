@@ -1,6 +1,6 @@
+#pragma once
 // What the store keeps of each commit beside the configuration it leads to: who made it, when and
 // why, what it changed, and whether it still waits for its confirmation. store.h hands it out.
-#pragma once
 
 #include <cstdint>
 #include <optional>
@@ -16,15 +16,15 @@ struct StoredValue {
     bool operator==(const StoredValue &) const = default;
 };
 
-// What is known of a commit before it is stored.
+/// What is known of a commit before it is stored.
 struct CommitNote {
     std::int64_t time = 0;            // seconds since 1970
     std::optional<std::uint32_t> uid; // none: the daemon itself
     std::string author;
     std::string comment;
     std::optional<std::uint64_t> rollback_to; // the commit whose configuration it brings back
-    // The commit waits so many seconds for its confirmation. Without it, it ends the wait of the
-    // commits before it: by undoing them, or else by confirming them.
+    /// The commit waits so many seconds for its confirmation. Without it, it ends the wait of the
+    /// commits before it: by undoing them, or else by confirming them.
     std::optional<std::uint32_t> confirm_within;
     bool undoes_wait = false;
 };
@@ -57,8 +57,8 @@ struct RecordedChange {
     bool operator==(const RecordedChange &) const = default;
 };
 
-// The last commit is to be undone unless it is confirmed in time, and with it all commits after
-// `back_to`: each of them was stored while the one before it was waiting.
+/// The last commit is to be undone unless it is confirmed in time, and with it all commits after
+/// `back_to`: each of them was stored while the one before it was waiting.
 struct Wait {
     std::uint64_t number = 0;
     std::uint64_t back_to = 0;
@@ -68,8 +68,8 @@ struct Wait {
     bool operator==(const Wait &) const = default;
 };
 
-// How much history is kept. The oldest commits go first; the newest stays whatever its size, and
-// so does what a waiting commit needs to be undone.
+/// How much history is kept. The oldest commits go first; the newest stays whatever its size, and
+/// so does what a waiting commit needs to be undone.
 struct HistoryBounds {
     std::uint64_t commits = 1000;
     std::uint64_t bytes = std::uint64_t{256} << 20; // of names and values

@@ -1,5 +1,9 @@
 #include "host/store/database_file.h"
 
+#include "host/store/schema.h"
+#include "host/store/store_error.h"
+#include "host/support/unique_fd.h"
+
 #include <fcntl.h>
 #include <sqlite3.h>
 #include <sys/stat.h>
@@ -10,10 +14,6 @@
 #include <cstdio>
 #include <string>
 #include <string_view>
-
-#include "host/store/schema.h"
-#include "host/store/store_error.h"
-#include "host/support/unique_fd.h"
 
 namespace ovhost
 {

@@ -1,11 +1,11 @@
 #include "host/store/history_tables.h"
 
+#include "host/store/store.h"
+
 #include <algorithm>
 #include <array>
 #include <string_view>
 #include <utility>
-
-#include "host/store/store.h"
 
 namespace ovhost
 {

@@ -1,8 +1,8 @@
 #include "host/store/schema.h"
 
-#include <array>
-
 #include "host/store/sqlite.h"
+
+#include <array>
 
 namespace ovhost
 {

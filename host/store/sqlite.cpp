@@ -1,10 +1,10 @@
 #include "host/store/sqlite.h"
 
+#include "host/store/store_error.h"
+
 #include <sqlite3.h>
 
 #include <cerrno>
-
-#include "host/store/store_error.h"
 
 namespace ovhost
 {

@@ -1,5 +1,7 @@
 #include "host/store/state_dir.h"
 
+#include "host/store/store_error.h"
+
 #include <fcntl.h>
 #include <sys/file.h>
 #include <sys/stat.h>
@@ -8,8 +10,6 @@
 #include <array>
 #include <cerrno>
 #include <string>
-
-#include "host/store/store_error.h"
 
 namespace ovhost
 {

@@ -1,11 +1,11 @@
 #include "host/store/store.h"
 
-#include <utility>
-
 #include "host/store/database_file.h"
 #include "host/store/history_tables.h"
 #include "host/store/sqlite.h"
 #include "host/store/state_dir.h"
+
+#include <utility>
 
 namespace ovhost
 {
