@@ -44,6 +44,8 @@ class Transaction
     /// round with a refusal there is none, for what it would say may follow from the first fault.
     void check();
 
+    /// Lets the modules put the changes into force; then is the time for what they tell others.
+    /// Nothing is refused any more: what fails is a warning.
     void apply();
     void notify();
 

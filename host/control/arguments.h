@@ -1,6 +1,6 @@
 #pragma once
-// Reads the arguments of a request, for those who handle one (RequestHandler in server.h). A
-// missing or wrongly typed argument is a RequestError "bad-request" that names command and
+// Reads the arguments of a request, for those who handle one (RequestHandler in request_handler.h).
+// A missing or wrongly typed argument is a RequestError "bad-request" that names command and
 // argument.
 
 #include <nlohmann/json_fwd.hpp>
@@ -16,6 +16,7 @@ namespace ovhost
 inline constexpr std::uint32_t longest_confirmation = 86400;
 
 [[nodiscard]] std::string required_text(const nlohmann::json &request, const char *name);
+/// One that is null counts as not given; so it does below.
 [[nodiscard]] std::string optional_text(const nlohmann::json &request, const char *name,
                                         const std::string &otherwise = {});
 /// Nothing when it is not given.

@@ -34,6 +34,8 @@ inline constexpr const char *stopping = "stopping";
 /// request carries it. Throws RequestError "bad-json" or "bad-request".
 [[nodiscard]] nlohmann::json parse_request(std::string_view line, nlohmann::json &id);
 
+/// Answers, an event for peers or watchers, and the last line before the daemon ends a connection:
+/// each a line, newline included. `id` is the request's, null when it has none.
 [[nodiscard]] std::string result_line(const nlohmann::json &id, const nlohmann::json &result);
 [[nodiscard]] std::string error_line(const nlohmann::json &id, const RequestError &error);
 [[nodiscard]] std::string event_line(const nlohmann::json &event);

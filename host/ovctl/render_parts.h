@@ -1,7 +1,6 @@
 #pragma once
-// What the renderers (render.h, render_tunnels.h, render_maps.h) have in common: members of a
-// result as text for people. A member that is missing or of another type throws
-// nlohmann::json::exception.
+// What the renderers (render*.h) have in common: members of a result as text for people. A member
+// that is missing or of another type throws nlohmann::json::exception.
 
 #include <nlohmann/json_fwd.hpp>
 
