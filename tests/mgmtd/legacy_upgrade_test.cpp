@@ -291,17 +291,80 @@ TEST_F(LegacyUpgradeTest, DoesNotOverwriteAMatchString)
     EXPECT_THAT(nodes(), IsEmpty());
 }
 
-TEST_F(LegacyUpgradeTest, RefusesFieldsThatMayNotFit)
+struct RoomCase {
+    std::vector<std::string> fields; ///< behind an application of `size` characters
+    std::size_t size;                ///< the longest application that leaves them room
+    const char *rest;                ///< of the match string
+    std::vector<const char *> lost;  ///< with one, two, ... characters more
+};
+
+// A match string has 1023 characters, of which "application:" takes 12 and ",dscp:ef" 8.
+const RoomCase room_cases[] = {
+    {{}, 1011, "", {"application", "application"}},
+    {{"dscp,string,ef"}, 1003, ",dscp:ef", {"dscp", "dscp"}},
+    // 18 and 8: the shorter pair still has room when the longer one has lost its own.
+    {{"vlan,string,lan0wan0net0", "dscp,string,ef"},
+     985,
+     ",vlan:lan0wan0net0,dscp:ef",
+     {"dscp", "dscp", "dscp", "dscp", "dscp", "dscp", "dscp", "dscp", "vlan"}},
+    {{"ipver,string,ipv6"}, 987, ",src_ip:::/0,dst_ip:::/0", {"dst_ip"}},
+    {{"ipver,string,ipv4", "src/port,string,80", "vlan,string,v1", "protocol,string,udp",
+      "dscp,string,ef"},
+     936,
+     ",src_ip:0.0.0.0/0,dst_ip:0.0.0.0/0,src_port:80,vlan:v1,protocol:udp,dscp:ef",
+     {"dscp"}},
+    {{"ipver,string,ipv4", "src/port,string,1024-65535", "dest/port,string,8080-8090",
+      "protocol,string,tcp", "dscp,string,af41"},
+     915,
+     ",src_ip:0.0.0.0/0,dst_ip:0.0.0.0/0,src_port:1024-65535,dst_port:8080-8090,protocol:tcp,"
+     "dscp:af41",
+     {"dscp"}},
+};
+
+TEST_F(LegacyUpgradeTest, RefusesEntriesThatWouldLoseAPair)
 {
     const std::string entry = route_maps + "/m/prio/10";
-    EXPECT_THAT(upgrade(entry_text(entry, {"application,string," + std::string(951, 'a')})),
-                ElementsAre("1/0"));
-    candidate_ = Candidate();
-    EXPECT_THAT(upgrade(entry_text(
-                    entry, {"application,string," + std::string(950, 'a'), "dscp,string,ef"})),
-                ElementsAre("0 " + entry +
-                            "/match/0|its fields have 952 characters; 951 are sure to fit a match "
-                            "string"));
+    for (const RoomCase &row : room_cases) {
+        const auto text = [&](std::size_t size) {
+            return entry_text(entry, {"application,string," + std::string(size, 'a')}) +
+                   entry_text(entry, row.fields);
+        };
+        candidate_ = Candidate();
+        const std::string longest = "application:" + std::string(row.size, 'a') + row.rest;
+        ASSERT_EQ(longest.size(), 1023U) << row.rest;
+        EXPECT_THAT(upgrade(text(row.size)), ElementsAre("1/0")) << row.rest;
+        EXPECT_THAT(nodes(), ElementsAre(entry + "/match/0/matchstr string " + longest));
+        candidate_ = Candidate();
+        std::size_t more = 0;
+        for (const char *lost : row.lost) {
+            ++more;
+            EXPECT_THAT(upgrade(text(row.size + more)),
+                        ElementsAre("0 " + entry + "/match/0|its match string would lack " + lost +
+                                    ", and the entry would match more: it needs " +
+                                    std::to_string(1023 + more) +
+                                    " characters, and there is room for 1023"))
+                << row.rest;
+            EXPECT_THAT(nodes(), IsEmpty());
+        }
+    }
+}
+
+// The pairs of both addresses are lost, and the one behind them still has room.
+TEST_F(LegacyUpgradeTest, NamesEveryPairThatWouldBeLost)
+{
+    const std::string entry = route_maps + "/m/prio/";
+    EXPECT_THAT(
+        upgrade(entry_text(entry + "10", {"application,string," + std::string(1000, 'a'),
+                                          "ipver,string,ipv4", "dscp,string,ef"}) +
+                entry_text(entry + "20", {"dscp,string,ef"}) +
+                entry_text(entry + "30", {"vlan,string," + std::string(1100, 'v')})),
+        ElementsAre("0 " + entry +
+                        "10/match/0|its match string would lack src_ip, dst_ip, and the "
+                        "entry would match more: it needs 1054 characters, and there is "
+                        "room for 1023",
+                    "0 " + entry +
+                        "30/match/0|its match string would lack vlan, and the entry would "
+                        "match more: it needs 1105 characters, and there is room for 1023"));
     EXPECT_THAT(nodes(), IsEmpty());
 }
 
