@@ -53,7 +53,7 @@ void check_record(const mdb_db *db, const std::string &acl, const MapEntry &entr
 void check_entry(const mdb_db *db, const MapEntry &entry, std::vector<ReferenceFault> &faults)
 {
     const std::string acl = acl_of(db, entry);
-    if (acl.empty() || node_binding(db, reference_node(acl, entry).c_str()) != nullptr) {
+    if (acl.empty() || node_text(db, reference_node(acl, entry))) {
         return;
     }
     const std::string missing = has_acl(db, acl) ? "record" : "such ACL";
@@ -108,7 +108,7 @@ std::vector<MapEntry> recorded_references(const mdb_db *db, const std::string &a
 void forget_reference(const md_dbinfo *dbinfo, const std::string &acl, const MapEntry &entry)
 {
     const std::string record = reference_node(acl, entry);
-    if (node_binding(dbinfo->newdb, record.c_str()) == nullptr) {
+    if (!node_text(dbinfo->newdb, record)) {
         return;
     }
     const std::string map = level_of_map(acl, entry);

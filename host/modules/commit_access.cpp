@@ -2,8 +2,6 @@
 
 #include "host/modules/node_access.h"
 
-#include <stdexcept>
-
 namespace ovhost
 {
 namespace
@@ -16,23 +14,14 @@ void write(const md_dbinfo *dbinfo, int operation, bn_type type, const char *tex
     auto *const newdb = const_cast<mdb_db *>(dbinfo->newdb);
     const int err =
         mdb_set_node_str(dbinfo->commit, newdb, operation, 0, type, text, "%s", node.c_str());
-    if (err != 0) {
-        throw std::runtime_error("cannot write " + node + ": error code " + std::to_string(err));
-    }
+    require(err, "write", node);
 }
 
 } // namespace
 
 std::vector<std::string> name_parts(const mdb_db_change *change)
 {
-    const tstr_array *const array = change->mdc_name_parts;
-    const auto count = static_cast<uint32>(tstr_array_length_quick(array));
-    std::vector<std::string> parts;
-    parts.reserve(count);
-    for (uint32 i = 0; i < count; ++i) {
-        parts.emplace_back(tstr_array_get_str_quick(array, i));
-    }
-    return parts;
+    return texts_of(change->mdc_name_parts);
 }
 
 bool matches(const mdb_db_change *change, const std::string &pattern)

@@ -11,7 +11,6 @@
 #include <algorithm>
 #include <optional>
 #include <set>
-#include <stdexcept>
 
 namespace ovhost
 {
@@ -54,19 +53,9 @@ std::set<std::string> touched_addresses(const mdb_db_change_array *changes)
 
 std::vector<Subnet> all_addresses(const mdb_db *db)
 {
-    tstr_array *array = nullptr;
-    const int err =
-        mdb_get_matching_tstr_array(nullptr, db, ip_pattern, mdqf_sel_class_no_state, &array);
-    const TstrArrayPtr nodes(array);
-    if (err != 0) {
-        throw std::runtime_error("the addresses cannot be listed: error code " +
-                                 std::to_string(err));
-    }
     std::vector<Subnet> addresses;
-    const auto count = static_cast<uint32>(tstr_array_length_quick(nodes.get()));
-    for (uint32 i = 0; i < count; ++i) {
-        const std::string node = address_node(tstr_array_get_str_quick(nodes.get(), i));
-        if (const std::optional<Subnet> address = read_address(db, node)) {
+    for (const std::string &node : matching_nodes(db, ip_pattern)) {
+        if (const std::optional<Subnet> address = read_address(db, address_node(node))) {
             addresses.push_back(*address);
         }
     }

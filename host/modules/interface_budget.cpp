@@ -7,7 +7,6 @@
 #include "orvale/md_utils.h"
 
 #include <algorithm>
-#include <stdexcept>
 
 namespace ovhost
 {
@@ -40,21 +39,12 @@ Tally count_interfaces(const mdb_db_change_array *changes)
 
 int count_configured(const mdb_db *db)
 {
-    tstr_array *array = nullptr;
-    const int err = mdb_get_matching_tstr_array(nullptr, db, tunneld_interface_pattern,
-                                                mdqf_sel_class_no_state, &array);
-    const TstrArrayPtr nodes(array);
-    if (err != 0) {
-        throw std::runtime_error("the interfaces cannot be counted: error code " +
-                                 std::to_string(err));
-    }
-    int configured = 0;
-    const auto count = static_cast<uint32>(tstr_array_length_quick(nodes.get()));
-    for (uint32 i = 0; i < count; ++i) {
-        // One without a value could not be seen to go.
-        configured += node_text(db, tstr_array_get_str_quick(nodes.get(), i)).has_value();
-    }
-    return configured;
+    // One without a value could not be seen to go.
+    const auto has_value = [db](const std::string &node) {
+        return node_text(db, node).has_value();
+    };
+    return static_cast<int>(
+        std::ranges::count_if(matching_nodes(db, tunneld_interface_pattern), has_value));
 }
 
 uint32 not_negative(int number)

@@ -5,7 +5,6 @@
 #include "orvale/md_tunneld_tunnel_common.h"
 
 #include <map>
-#include <stdexcept>
 
 namespace ovhost
 {
@@ -15,17 +14,9 @@ namespace
 std::vector<std::string> vlan_names(const mdb_db *db)
 {
     tstr_array *array = nullptr;
-    if (const int err = md_get_vlan_interfaces(db, &array); err != 0) {
-        throw std::runtime_error("cannot list the VLAN interfaces: error code " +
-                                 std::to_string(err));
-    }
+    require(md_get_vlan_interfaces(db, &array), "list the VLAN interfaces");
     const TstrArrayPtr owned(array);
-    const auto count = owned ? static_cast<uint32>(tstr_array_length_quick(owned.get())) : 0;
-    std::vector<std::string> names;
-    for (uint32 i = 0; i < count; ++i) {
-        names.emplace_back(tstr_array_get_str_quick(owned.get(), i));
-    }
-    return names;
+    return texts_of(owned.get());
 }
 
 std::optional<bool> enable_flag(const mdb_db *db, const std::string &name)

@@ -37,9 +37,9 @@ std::string tunneld_interface(const std::string &kind, const std::string &name)
 
 bool interface_exists(const mdb_db *db, const std::string &name)
 {
-    return node_text(db, interface_record(name)) ||
-           node_text(db, tunneld_interface(vlan_kind, name)) ||
-           node_text(db, tunneld_interface(tunnel_kind, name));
+    return !name.empty() && (node_text(db, interface_record(name)) ||
+                             node_text(db, tunneld_interface(vlan_kind, name)) ||
+                             node_text(db, tunneld_interface(tunnel_kind, name)));
 }
 
 std::optional<std::string> interface_name_fault(const std::string &name)

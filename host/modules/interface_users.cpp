@@ -8,7 +8,6 @@
 
 #include <algorithm>
 #include <iterator>
-#include <stdexcept>
 
 namespace ovhost
 {
@@ -31,32 +30,10 @@ constexpr User users[] = {
     {"/ov/redd/net/interface/vrrp/config/*", "a VRRP entry's name", 6},
 };
 
-void require(int err, const char *deed)
-{
-    if (err != 0) {
-        throw std::runtime_error(std::string("cannot ") + deed + ": error code " +
-                                 std::to_string(err));
-    }
-}
-
-void add_texts(const tstr_array *texts, std::vector<std::string> &all)
-{
-    const auto count = static_cast<uint32>(tstr_array_length_quick(texts));
-    for (uint32 i = 0; i < count; ++i) {
-        all.emplace_back(tstr_array_get_str_quick(texts, i));
-    }
-}
-
 /// The library knows what these nodes are called, but does not look for them.
 std::vector<std::string> router_nodes(const mdb_db *db, const std::string &name)
 {
-    tstr_array *array = nullptr;
-    require(
-        mdb_get_matching_tstr_array(nullptr, db, router_pattern, mdqf_sel_class_no_state, &array),
-        "list the interfaces of router mode");
-    const TstrArrayPtr owned(array);
-    std::vector<std::string> nodes;
-    add_texts(array, nodes);
+    std::vector<std::string> nodes = matching_nodes(db, router_pattern);
     std::erase_if(nodes, [&](const std::string &node) { return node_text(db, node) != name; });
     return nodes;
 }
@@ -66,8 +43,7 @@ std::vector<std::string> use_nodes(const mdb_db *db, std::string name)
     tstr_array *array = nullptr;
     require(md_interface_usage_check(db, name.data(), &array), "look for who uses an interface");
     const TstrArrayPtr owned(array);
-    std::vector<std::string> nodes;
-    add_texts(array, nodes);
+    std::vector<std::string> nodes = texts_of(owned.get());
     std::ranges::copy(router_nodes(db, name), std::back_inserter(nodes));
     return nodes;
 }

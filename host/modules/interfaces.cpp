@@ -24,15 +24,6 @@ bool is_deleted(const mdb_db_change *change)
     return change->mdc_change_type == mdct_delete;
 }
 
-bool has_preferred_interface(const mdb_db *db)
-{
-    tstr_array *array = nullptr;
-    const int err = mdb_get_matching_tstr_array(nullptr, db, preferred_pattern,
-                                                mdqf_sel_class_no_state, &array);
-    const TstrArrayPtr nodes(array);
-    return err == 0 && nodes != nullptr && tstr_array_length_quick(nodes.get()) > 0;
-}
-
 } // namespace
 
 std::vector<std::string> VlansModule::patterns() const
@@ -81,7 +72,7 @@ std::vector<std::string> PreferredInterfacesModule::patterns() const
 
 int PreferredInterfacesModule::check_change(md_dbinfo *dbinfo, mdb_db_change *change)
 {
-    if (!is_deleted(change) || has_preferred_interface(dbinfo->newdb)) {
+    if (!is_deleted(change) || !matching_nodes(dbinfo->newdb, preferred_pattern).empty()) {
         return 0;
     }
     tbool is_used = false;

@@ -11,12 +11,6 @@ namespace
 
 constexpr const char *dns_proxy_root = "/ov/dnsproxy/config/0/map";
 
-/// A text as the operations take it ends at its first NUL byte, which no name holds.
-bool is_plain(const std::string &text)
-{
-    return text.find('\0') == std::string::npos;
-}
-
 MapFacts facts_of(const mdb_db *db, const MapKind &kind, const std::string &map)
 {
     MapFacts facts{kind.name, map, {}};
@@ -68,7 +62,7 @@ std::vector<MapFacts> list_maps(const mdb_db *db)
 
 std::optional<AclFacts> find_acl(const mdb_db *db, const std::string &acl)
 {
-    if (!is_plain(acl) || !has_acl(db, acl)) {
+    if (!is_whole_text(acl) || !has_acl(db, acl)) {
         return std::nullopt;
     }
     AclFacts facts;

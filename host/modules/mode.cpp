@@ -3,8 +3,6 @@
 #include "host/modules/node_access.h"
 #include "orvale/md_tunneld_tunnel_common.h"
 
-#include <stdexcept>
-
 namespace ovhost
 {
 namespace
@@ -15,10 +13,7 @@ std::optional<std::string> ask_text(int (*getter)(const mdb_db *, char **), cons
                                     const char *what)
 {
     char *text = nullptr;
-    if (const int err = getter(db, &text); err != 0) {
-        throw std::runtime_error(std::string("cannot read the ") + what + ": error code " +
-                                 std::to_string(err));
-    }
+    require(getter(db, &text), "read the", what);
     const TextPtr owned(text);
     return text != nullptr ? std::optional<std::string>(text) : std::nullopt;
 }
@@ -34,11 +29,8 @@ ModeAnswers ask_mode(const mdb_db *db)
     answers.router = md_is_db_system_router_mode(db);
     answers.server = md_is_db_system_server_mode(db);
     answers.inline_router = md_is_db_system_inline_router_mode(db);
-    if (const int err = md_get_number_router_mode_interfaces(db, &answers.router_interfaces);
-        err != 0) {
-        throw std::runtime_error("cannot count the router interfaces: error code " +
-                                 std::to_string(err));
-    }
+    require(md_get_number_router_mode_interfaces(db, &answers.router_interfaces),
+            "count the router interfaces");
     answers.ten_gigabit = md_is_10g_enabled(db);
     answers.bonding = md_is_bonding_enabled(db);
     return answers;

@@ -4,44 +4,75 @@
 
 #include <charconv>
 #include <new>
+#include <stdexcept>
 
 namespace ovhost
 {
 
+void require(int err, std::string_view deed, std::string_view object)
+{
+    if (err != 0) {
+        throw std::runtime_error("cannot " + std::string(deed) + (object.empty() ? "" : " ") +
+                                 std::string(object) + ": error code " + std::to_string(err));
+    }
+}
+
 TstringPtr attribute_text(const bn_attrib_array *attribs)
 {
     tstring *text = nullptr;
-    const int err = bn_attrib_array_get_attrib_tstr(attribs, ba_value, &text);
-    return TstringPtr(err == 0 ? text : nullptr);
+    require(bn_attrib_array_get_attrib_tstr(attribs, ba_value, &text), "read a change's value");
+    return TstringPtr(text);
 }
 
-BindingPtr node_binding(const mdb_db *db, const char *name)
+BindingPtr node_binding(const mdb_db *db, const std::string &name)
 {
     bn_binding *binding = nullptr;
-    const int err = mdb_get_node_binding(nullptr, db, name, 0, &binding);
-    return BindingPtr(err == 0 ? binding : nullptr);
+    require(mdb_get_node_binding(nullptr, db, name.c_str(), 0, &binding), "read", name);
+    return BindingPtr(binding);
 }
 
 std::optional<std::string> node_text(const mdb_db *db, const std::string &name)
 {
     tstring *text = nullptr;
-    const int err = mdb_get_node_value_tstr(nullptr, db, name.c_str(), 0, nullptr, &text);
-    const TstringPtr owned(err == 0 ? text : nullptr);
+    require(mdb_get_node_value_tstr(nullptr, db, name.c_str(), 0, nullptr, &text), "read", name);
+    const TstringPtr owned(text);
     return owned ? std::optional<std::string>(ts_str(owned.get())) : std::nullopt;
 }
 
 std::vector<std::string> child_names(const mdb_db *db, const std::string &parent)
 {
     tstr_array *array = nullptr;
-    const int err = mdb_get_tstr_array(nullptr, db, parent.c_str(), 0, 0, 0, &array);
-    const TstrArrayPtr owned(err == 0 ? array : nullptr);
-    const auto count = owned ? static_cast<uint32>(tstr_array_length_quick(owned.get())) : 0;
-    std::vector<std::string> names;
-    names.reserve(count);
+    require(mdb_get_tstr_array(nullptr, db, parent.c_str(), 0, 0, 0, &array), "list the nodes of",
+            parent);
+    const TstrArrayPtr owned(array);
+    return texts_of(owned.get());
+}
+
+std::vector<std::string> matching_nodes(const mdb_db *db, const std::string &pattern)
+{
+    tstr_array *array = nullptr;
+    require(
+        mdb_get_matching_tstr_array(nullptr, db, pattern.c_str(), mdqf_sel_class_no_state, &array),
+        "look for", pattern);
+    const TstrArrayPtr owned(array);
+    return texts_of(owned.get());
+}
+
+std::vector<std::string> texts_of(const tstr_array *array)
+{
+    const auto count =
+        array != nullptr ? static_cast<uint32>(tstr_array_length_quick(array)) : uint32{0};
+    std::vector<std::string> texts;
+    texts.reserve(count);
     for (uint32 i = 0; i < count; ++i) {
-        names.emplace_back(tstr_array_get_str_quick(owned.get(), i));
+        texts.emplace_back(tstr_array_get_str_quick(array, i));
     }
-    return names;
+    return texts;
+}
+
+bool is_whole_text(std::string_view text)
+{
+    return text.find('\0') == std::string_view::npos;
 }
 
 std::optional<uint32> parse_number(std::string_view text)
@@ -71,9 +102,8 @@ std::string type_name(bn_type type)
 std::optional<bn_type> find_type(const std::string &name)
 {
     bn_type type = 0;
-    // The operation would take a NUL byte for the end of the name.
-    const bool found = name.find('\0') == std::string::npos &&
-                       lc_string_to_enum(bn_type_map, name.c_str(), &type) == 0;
+    const bool found =
+        is_whole_text(name) && lc_string_to_enum(bn_type_map, name.c_str(), &type) == 0;
     return found ? std::optional(type) : std::nullopt;
 }
 

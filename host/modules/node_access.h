@@ -1,5 +1,9 @@
 #pragma once
-// What modules need of nodes: the operations of framework/ with owners around what they hand out.
+// What modules need of nodes: the operations of framework/ with owners around what they hand out,
+// and exceptions for what fails. To a check, a node that cannot be read is not one that is absent:
+// "nobody uses it" would be the answer of a guard that could not look.
+//
+// commit_access.h has what checks need besides.
 
 #include "framework/mdb_db.h"
 #include "framework/typed_arrays.h"
@@ -39,17 +43,31 @@ struct TextDeleter {
 };
 using TextPtr = std::unique_ptr<char, TextDeleter>;
 
+/// Throws std::runtime_error, "cannot DEED: error code N" or "cannot DEED OBJECT: error code N",
+/// for every code but 0. Every function below that asks the database throws it with the node's
+/// name.
+void require(int err, std::string_view deed, std::string_view object = {});
+
 /// The value among a change's attributes; null when there is none.
 [[nodiscard]] TstringPtr attribute_text(const bn_attrib_array *attribs);
 
-/// A node; null when it is absent or cannot be read.
-[[nodiscard]] BindingPtr node_binding(const mdb_db *db, const char *name);
+/// A node; null when it is absent.
+[[nodiscard]] BindingPtr node_binding(const mdb_db *db, const std::string &name);
 
-/// The value of a node as text; nothing when it is absent or cannot be read.
+/// The value of a node as text; nothing when it is absent.
 [[nodiscard]] std::optional<std::string> node_text(const mdb_db *db, const std::string &name);
 
-/// The names of a node's children, escapes resolved; none when they cannot be read.
+/// The names of a node's children, escapes resolved.
 [[nodiscard]] std::vector<std::string> child_names(const mdb_db *db, const std::string &parent);
+
+/// The full names of the nodes that match a pattern.
+[[nodiscard]] std::vector<std::string> matching_nodes(const mdb_db *db, const std::string &pattern);
+
+/// The texts of an array; none when it is null.
+[[nodiscard]] std::vector<std::string> texts_of(const tstr_array *array);
+
+/// Whether a text is the same to an operation, to which it ends at its first NUL byte.
+[[nodiscard]] bool is_whole_text(std::string_view text);
 
 /// A decimal number; nothing when the text is none or it is too large.
 [[nodiscard]] std::optional<uint32> parse_number(std::string_view text);

@@ -11,7 +11,6 @@
 #include <algorithm>
 #include <iterator>
 #include <optional>
-#include <stdexcept>
 
 namespace ovhost
 {
@@ -125,13 +124,9 @@ std::vector<std::string> next_hops_in(const mdb_db *db, const Subnet &subnet)
 void remove_next_hops(const md_dbinfo *dbinfo, const Subnet &subnet)
 {
     auto *const newdb = const_cast<mdb_db *>(dbinfo->newdb);
-    const int err = md_tunneld_delete_dproutes(dbinfo->commit, newdb, subnet.address.c_str(),
-                                               subnet.mask_length, nullptr);
-    if (err != 0) {
-        throw std::runtime_error("cannot remove the routes behind " + subnet.address + "/" +
-                                 std::to_string(subnet.mask_length) + ": error code " +
-                                 std::to_string(err));
-    }
+    require(md_tunneld_delete_dproutes(dbinfo->commit, newdb, subnet.address.c_str(),
+                                       subnet.mask_length, nullptr),
+            "remove the routes behind", subnet.address + "/" + std::to_string(subnet.mask_length));
     remove_what_is_left(dbinfo, subnet);
 }
 

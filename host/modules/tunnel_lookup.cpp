@@ -7,7 +7,6 @@
 
 #include <algorithm>
 #include <functional>
-#include <stdexcept>
 
 namespace ovhost
 {
@@ -47,12 +46,6 @@ TunnelAnswer find_claims(const mdb_db *db, const Claim &claims)
     return answer;
 }
 
-/// A text as the cache takes it ends at its first NUL byte, which none of its own holds.
-bool is_plain(const std::string &text)
-{
-    return text.find('\0') == std::string::npos;
-}
-
 } // namespace
 
 std::vector<TunnelFacts> list_tunnels(const mdb_db *db)
@@ -67,10 +60,7 @@ std::vector<TunnelFacts> list_tunnels(const mdb_db *db)
             err = name != nullptr ? md_get_tunnel_id_sorted(make_tstring(name).get(), &id)
                                   : lc_err_unexpected_null;
         }
-        if (err != 0) {
-            throw std::runtime_error("cannot list tunnel " + std::to_string(position) + " of " +
-                                     std::to_string(count) + ": error code " + std::to_string(err));
-        }
+        require(err, "list tunnel", std::to_string(position) + " of " + std::to_string(count));
         tunnels.push_back(facts_of(db, name, id));
     }
     return tunnels;
@@ -78,7 +68,8 @@ std::vector<TunnelFacts> list_tunnels(const mdb_db *db)
 
 TunnelAnswer find_tunnel_by_name(const mdb_db *db, const std::string &name)
 {
-    const uint32 id = is_plain(name) ? md_tunbin_ht_get_id_by_name(name.c_str()) : TUNNEL_ID_NONE;
+    const uint32 id =
+        is_whole_text(name) ? md_tunbin_ht_get_id_by_name(name.c_str()) : TUNNEL_ID_NONE;
     if (id != TUNNEL_ID_NONE) {
         return {false, {facts_of(db, name, id)}};
     }
@@ -88,7 +79,7 @@ TunnelAnswer find_tunnel_by_name(const mdb_db *db, const std::string &name)
 TunnelAnswer find_tunnel_by_alias(const mdb_db *db, const std::string &alias)
 {
     const uint32 id =
-        is_plain(alias) ? md_tunbin_ht_get_id_by_alias(alias.c_str()) : TUNNEL_ID_NONE;
+        is_whole_text(alias) ? md_tunbin_ht_get_id_by_alias(alias.c_str()) : TUNNEL_ID_NONE;
     if (id != TUNNEL_ID_NONE) {
         return find_tunnel_by_id(db, id);
     }
