@@ -1,14 +1,15 @@
 #include "host/commit/commit_store.h"
 
 #include "tests/commit/support.h"
+#include "tests/support/scratch_dir.h"
 
 #include <gmock/gmock.h>
 
 using commit_test::Config;
 using commit_test::config_of;
 using commit_test::MemoryStore;
-using commit_test::TemporaryDirectory;
 using commit_test::tree_of;
+using ovtest::ScratchDir;
 
 namespace
 {
@@ -32,7 +33,7 @@ TEST(CommitStoreTest, ChangesBecomeStoredChangesInOrder)
 
 TEST(CommitStoreTest, StoreHoldsAcrossTheAdapterWhatWasCommitted)
 {
-    const TemporaryDirectory directory;
+    const ScratchDir directory;
     const ovhost::Tree configured = tree_of({{"/a", "1"}, {"/n/1\\/2", "x"}});
     {
         ovhost::Store store = ovhost::Store::open(directory.path());

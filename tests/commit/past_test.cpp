@@ -4,6 +4,7 @@
 #include "host/commit/patch.h"
 #include "host/store/store.h"
 #include "tests/commit/support.h"
+#include "tests/support/scratch_dir.h"
 
 #include <gmock/gmock.h>
 
@@ -11,7 +12,6 @@
 
 using commit_test::Config;
 using commit_test::config_of;
-using commit_test::TemporaryDirectory;
 using commit_test::tree_of;
 using ovhost::configuration_after;
 using ovhost::diff;
@@ -19,6 +19,7 @@ using ovhost::oldest_known_commit;
 using ovhost::Store;
 using ovhost::Tree;
 using ovhost::with_changes;
+using ovtest::ScratchDir;
 
 namespace
 {
@@ -39,7 +40,7 @@ class PastTest : public testing::Test
         return config_of(configuration_after(store_, running_, number));
     }
 
-    TemporaryDirectory directory_;
+    ScratchDir directory_;
     Store store_ = Store::open(directory_.path(), {3, 1'000'000});
     Tree running_;
 };
@@ -110,7 +111,7 @@ TEST_F(PastTest, RefusesAHistoryOfNamesThatAreNone)
 
 TEST(PastPropertyTest, EveryConfigurationOfARandomHistoryComesBack)
 {
-    const TemporaryDirectory directory;
+    const ScratchDir directory;
     Store store = Store::open(directory.path());
     std::mt19937 random(5);
     const auto below = [&random](unsigned bound) {

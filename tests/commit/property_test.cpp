@@ -3,6 +3,7 @@
 // modules' own state and the candidate are what the model says, whatever went wrong.
 #include "framework/md_commit.h"
 #include "tests/commit/support.h"
+#include "tests/support/scratch_dir.h"
 
 #include <gtest/gtest.h>
 
@@ -422,7 +423,7 @@ class ReopenedStore : public ovhost::CommitStore
 TEST(CommitPropertyTest, RandomCommitsOnAStoreOnDisk)
 {
     const commit_test::LogCapture quiet;
-    const commit_test::TemporaryDirectory directory;
+    const ovtest::ScratchDir directory;
     ReopenedStore store(directory.path());
     RandomCommits commits(store, 4711);
     for (unsigned step = 0; step < 300; ++step) {

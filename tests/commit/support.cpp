@@ -183,21 +183,6 @@ std::vector<std::string> LogCapture::texts(int level) const
     return found;
 }
 
-TemporaryDirectory::TemporaryDirectory()
-{
-    std::string pattern = (std::filesystem::temp_directory_path() / "commit-test-XXXXXX").string();
-    if (::mkdtemp(pattern.data()) == nullptr) {
-        throw std::system_error(errno, std::generic_category(), pattern);
-    }
-    path_ = pattern;
-}
-
-TemporaryDirectory::~TemporaryDirectory()
-{
-    std::error_code ignored;
-    std::filesystem::remove_all(path_, ignored);
-}
-
 Bench::Bench(std::initializer_list<ovhost::Module *> modules)
 {
     for (ovhost::Module *module : modules) {

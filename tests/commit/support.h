@@ -115,21 +115,6 @@ class LogCapture
     ovhost::LogSink previous_;
 };
 
-/// A new directory that goes with the object.
-class TemporaryDirectory
-{
-  public:
-    TemporaryDirectory();
-    TemporaryDirectory(const TemporaryDirectory &) = delete;
-    TemporaryDirectory &operator=(const TemporaryDirectory &) = delete;
-    ~TemporaryDirectory();
-
-    [[nodiscard]] const std::filesystem::path &path() const { return path_; }
-
-  private:
-    std::filesystem::path path_;
-};
-
 /// An engine over a store in memory. What it logs goes nowhere else.
 struct Bench {
     LogCapture log;

@@ -4,9 +4,9 @@
 
 #include "host/support/unique_fd.h"
 #include "host/support/user_name.h"
-#include "tests/control/eventually.h"
 #include "tests/control/raw_client.h"
 #include "tests/control/test_server.h"
+#include "tests/support/eventually.h"
 
 #include <gmock/gmock.h>
 #include <gtest/gtest.h>
@@ -20,7 +20,7 @@ namespace ovhost
 namespace
 {
 
-using test::eventually;
+using ovtest::eventually;
 using test::RawClient;
 using test::TestServer;
 using testing::UnorderedElementsAreArray;

@@ -4,9 +4,10 @@
 
 #include "host/control/listen_socket.h"
 #include "host/control/socket_address.h"
-#include "tests/control/eventually.h"
-#include "tests/control/temp_dir.h"
 #include "tests/control/test_server.h"
+#include "tests/support/eventually.h"
+#include "tests/support/files.h"
+#include "tests/support/scratch_dir.h"
 
 #include <gtest/gtest.h>
 #include <poll.h>
@@ -23,9 +24,9 @@ namespace
 {
 
 using nlohmann::json;
+using ovtest::eventually;
+using ovtest::ScratchDir;
 using std::chrono::milliseconds;
-using test::eventually;
-using test::TempDir;
 using test::TestServer;
 using Kind = ClientError::Kind;
 
@@ -54,7 +55,7 @@ class CannedServer
         static_cast<void>(::send(client.get(), answer.data(), answer.size(), MSG_NOSIGNAL));
     }
 
-    TempDir dir_;
+    ScratchDir dir_;
     ListenSocket socket_;
     std::thread thread_;
 };
@@ -121,7 +122,7 @@ TEST(ClientTest, ARequestThatIsTooLongIsRefusedWithTheReason)
 
 TEST(ClientTest, WithoutADaemonItSaysWhatToDo)
 {
-    const TempDir dir;
+    const ScratchDir dir;
     const std::string path = dir.path("socket");
     const Fault missing = fault_of([&] { const ControlClient client(path); });
     EXPECT_EQ(missing.kind, Kind::unreachable);
@@ -129,7 +130,7 @@ TEST(ClientTest, WithoutADaemonItSaysWhatToDo)
                                    ": No such file or directory; is mgmtd running, and is this "
                                    "its --socket?");
 
-    test::write_file(path, "");
+    ovtest::write_file(path, "");
     const Fault refused = fault_of([&] { const ControlClient client(path); });
     EXPECT_EQ(refused.kind, Kind::unreachable);
     EXPECT_EQ(refused.message, "cannot connect to " + path +
@@ -143,7 +144,7 @@ TEST(ClientTest, APathCanBeTooLong)
 
 TEST(ClientTest, ADaemonThatTakesNoConnectionsIsNotWaitedForForEver)
 {
-    const TempDir dir;
+    const ScratchDir dir;
     const UniqueFd busy = new_socket();
     const sockaddr_un address = socket_address(dir.path("socket"));
     ASSERT_EQ(::bind(busy.get(), reinterpret_cast<const sockaddr *>(&address), sizeof(address)), 0);
@@ -157,7 +158,7 @@ TEST(ClientTest, ADaemonThatTakesNoConnectionsIsNotWaitedForForEver)
 
 TEST(ClientTest, AnAnswerThatDoesNotComeIsATimeout)
 {
-    const TempDir dir;
+    const ScratchDir dir;
     const ListenSocket silent(dir.path("socket"));
     ControlClient client(dir.path("socket"), milliseconds(50));
     const Fault fault = fault_of([&] { client.call("commit"); });
@@ -168,7 +169,7 @@ TEST(ClientTest, AnAnswerThatDoesNotComeIsATimeout)
 
 TEST(ClientTest, ARequestThatIsNotTakenIsATimeout)
 {
-    const TempDir dir;
+    const ScratchDir dir;
     const ListenSocket silent(dir.path("socket"));
     ControlClient client(dir.path("socket"), milliseconds(1000));
     const Fault fault = fault_of([&] {

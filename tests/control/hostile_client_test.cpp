@@ -1,9 +1,9 @@
 // Clients that send what they should not, or do not read: the daemon lives on and the others do not
 // notice. host/control/connection.h is what holds them off.
 
-#include "tests/control/eventually.h"
 #include "tests/control/raw_client.h"
 #include "tests/control/test_server.h"
+#include "tests/support/eventually.h"
 
 #include <gtest/gtest.h>
 
@@ -19,7 +19,7 @@ namespace
 {
 
 using nlohmann::json;
-using test::eventually;
+using ovtest::eventually;
 using test::RawClient;
 using test::TestServer;
 

@@ -2,10 +2,11 @@
 
 #include "host/jsond/backoff.h"
 #include "host/jsond/event_writer.h"
-#include "tests/control/eventually.h"
-#include "tests/control/process.h"
-#include "tests/control/temp_dir.h"
 #include "tests/control/test_server.h"
+#include "tests/support/eventually.h"
+#include "tests/support/files.h"
+#include "tests/support/process.h"
+#include "tests/support/scratch_dir.h"
 
 #include <fcntl.h>
 #include <gtest/gtest.h>
@@ -24,11 +25,11 @@ namespace
 {
 
 using nlohmann::json;
+using ovtest::eventually;
+using ovtest::Process;
+using ovtest::read_file;
+using ovtest::ScratchDir;
 using std::chrono::milliseconds;
-using test::eventually;
-using test::Process;
-using test::read_file;
-using test::TempDir;
 using test::TestServer;
 
 class JsondTest : public testing::Test
@@ -46,7 +47,7 @@ class JsondTest : public testing::Test
         return eventually([&] { return server.peers().size() == 1; });
     }
 
-    TempDir dir_;
+    ScratchDir dir_;
     std::string path_ = dir_.path("socket");
 };
 
@@ -70,7 +71,7 @@ TEST_F(JsondTest, WritesEachEventAsALine)
 TEST_F(JsondTest, AppendsToItsFile)
 {
     const std::string file = dir_.path("events");
-    test::write_file(file, "\"old\"\n");
+    ovtest::write_file(file, "\"old\"\n");
     TestServer server({}, {}, path_);
     Process jsond(command({"--output", file}));
     ASSERT_TRUE(wait_for_peer(server));

@@ -3,7 +3,8 @@
 #include "host/control/listen_socket.h"
 
 #include "host/control/socket_address.h"
-#include "tests/control/temp_dir.h"
+#include "tests/support/files.h"
+#include "tests/support/scratch_dir.h"
 
 #include <gtest/gtest.h>
 #include <sys/socket.h>
@@ -18,9 +19,9 @@ namespace ovhost
 namespace
 {
 
-using test::read_file;
-using test::TempDir;
-using test::write_file;
+using ovtest::read_file;
+using ovtest::ScratchDir;
+using ovtest::write_file;
 
 class ListenSocketTest : public testing::Test
 {
@@ -46,7 +47,7 @@ class ListenSocketTest : public testing::Test
         ASSERT_EQ(::listen(fd.get(), 1), 0);
     }
 
-    TempDir dir_;
+    ScratchDir dir_;
     std::string path_ = dir_.path("socket");
 };
 

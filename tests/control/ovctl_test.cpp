@@ -1,13 +1,13 @@
 // The client as its users see it: command lines, texts to the byte, exit codes. host/ovctl/.
 
-#include "tests/control/process.h"
-#include "tests/control/temp_dir.h"
 #include "tests/control/test_server.h"
+#include "tests/support/files.h"
+#include "tests/support/process.h"
+#include "tests/support/scratch_dir.h"
 
 #include <gtest/gtest.h>
 
 #include <optional>
-#include <ostream>
 #include <string>
 #include <vector>
 
@@ -17,31 +17,17 @@ namespace
 {
 
 using nlohmann::json;
-using test::Process;
-using test::TempDir;
+using ovtest::Outcome;
+using ovtest::Process;
+using ovtest::ScratchDir;
 using test::TestServer;
-
-struct Outcome {
-    int exit;
-    std::string out;
-    std::string err;
-
-    bool operator==(const Outcome &) const = default;
-};
-
-void PrintTo(const Outcome &outcome, std::ostream *stream)
-{
-    *stream << "exit " << outcome.exit << "\nout: " << outcome.out << "\nerr: " << outcome.err;
-}
 
 Outcome run(const std::vector<std::string> &words, const std::string &input = {},
             const std::vector<std::string> &environment = {})
 {
     std::vector<std::string> argv{OVMD_OVCTL};
     argv.insert(argv.end(), words.begin(), words.end());
-    Process process(argv, input, environment);
-    const int exit = process.wait();
-    return {exit, process.out(), process.err()};
+    return ovtest::run(argv, input, environment);
 }
 
 /// A daemon that gives one answer and keeps the request.
@@ -141,9 +127,9 @@ TEST_F(OvctlTest, DeleteSendsTheName)
 
 TEST_F(OvctlTest, LoadSendsAFile)
 {
-    const TempDir dir;
+    const ScratchDir dir;
     const std::string text = "# comment\n/a,uint32,5\n-/b\n";
-    test::write_file(dir.path("site.db"), text);
+    ovtest::write_file(dir.path("site.db"), text);
     answer_with({{"set", 1}, {"removed", 2}});
     EXPECT_EQ(ask({"load", dir.path("site.db")}),
               (Outcome{0, "loaded 1 value and 2 removals\n", ""}));
@@ -162,9 +148,9 @@ TEST_F(OvctlTest, LoadReadsStandardInput)
 
 TEST_F(OvctlTest, UpgradeSendsAFileAndPrintsTheChanges)
 {
-    const TempDir dir;
+    const ScratchDir dir;
     const std::string text = "/a,string,x\n";
-    test::write_file(dir.path("legacy.db"), text);
+    ovtest::write_file(dir.path("legacy.db"), text);
     const json matchstr = {{"change", "add"},
                            {"name", "/m"},
                            {"old", nullptr},
@@ -209,13 +195,13 @@ TEST_F(OvctlTest, AFileThatCannotBeReadIsNamed)
 
 TEST_F(OvctlTest, AFileThatIsTooLongIsNotSent)
 {
-    const TempDir dir;
+    const ScratchDir dir;
     const std::string file = dir.path("site.db");
-    test::write_file(file, std::string(16UL << 20, '#'));
+    ovtest::write_file(file, std::string(16UL << 20, '#'));
     answer_with({{"set", 0}, {"removed", 0}});
     // With what else is in the request this one is too long for mgmtd, which says so.
-    EXPECT_EQ(ask({"load", file}).exit, 1);
-    test::write_file(file, std::string((16UL << 20) + 1, '#'));
+    EXPECT_EQ(ask({"load", file}).exit_code, 1);
+    ovtest::write_file(file, std::string((16UL << 20) + 1, '#'));
     EXPECT_EQ(
         ask({"load", file}),
         (Outcome{2, "", "ovctl: " + file + " is longer than 16 MiB: load it in smaller parts\n"}));
@@ -247,7 +233,7 @@ TEST_F(OvctlTest, CommitSaysItsNumber)
     answer_with({{"number", 7}, {"changes", 2}, {"warnings", json::array()}});
     EXPECT_EQ(ask({"commit"}), (Outcome{0, "commit 7: 2 changes\n", ""}));
     EXPECT_EQ(request(), (json{{"command", "commit"}}));
-    EXPECT_EQ(ask({"commit", "--comment", "new site"}).exit, 0);
+    EXPECT_EQ(ask({"commit", "--comment", "new site"}).exit_code, 0);
     EXPECT_EQ(request(), (json{{"command", "commit"}, {"comment", "new site"}}));
 }
 
@@ -332,7 +318,7 @@ TEST_F(OvctlTest, StatusOfADaemonWithLittle)
                  {"candidate_changes", 0},
                  {"peers", json::array()}});
     const Outcome outcome = ask({"status"});
-    EXPECT_EQ(outcome.exit, 0);
+    EXPECT_EQ(outcome.exit_code, 0);
     EXPECT_NE(outcome.out.find("uptime              00:00:59\n"
                                "model               none\n"),
               std::string::npos)
@@ -657,7 +643,7 @@ TEST_F(OvctlTest, AlarmSendsItsText)
     answer_with(json::object());
     EXPECT_EQ(ask({"alarm", "restart the appliance"}), (Outcome{0, "", ""}));
     EXPECT_EQ(request(), (json{{"command", "alarm"}, {"text", "restart the appliance"}}));
-    EXPECT_EQ(ask({"alarm"}).exit, 2);
+    EXPECT_EQ(ask({"alarm"}).exit_code, 2);
 }
 
 TEST_F(OvctlTest, ARefusalOfSeveralLinesKeepsThem)
@@ -689,8 +675,8 @@ TEST_F(OvctlTest, ARefusedFileNamesItsLines)
 
 TEST_F(OvctlTest, ARefusedFileIsNamedAsItWasGiven)
 {
-    const TempDir dir;
-    test::write_file(dir.path("site.db"), "x");
+    const ScratchDir dir;
+    ovtest::write_file(dir.path("site.db"), "x");
     refuse_with({"bad-lines", "1 line is bad", {{"", "no type", "", 1}}});
     EXPECT_EQ(ask({"load", dir.path("site.db")}),
               (Outcome{1, "",
@@ -734,7 +720,7 @@ TEST_F(OvctlTest, AnAnswerThatLacksSomethingIsAProtocolError)
 {
     answer_with({{"changes", 2}});
     const Outcome outcome = ask({"commit"});
-    EXPECT_EQ(outcome.exit, 4);
+    EXPECT_EQ(outcome.exit_code, 4);
     EXPECT_NE(outcome.err.find("ovctl: mgmtd's answer lacks something: "), std::string::npos);
     EXPECT_NE(outcome.err.find("warnings"), std::string::npos);
 }
@@ -764,7 +750,7 @@ TEST(OvctlWithoutDaemonTest, SaysWhatToDo)
 
 TEST(OvctlWithoutDaemonTest, ADaemonThatDoesNotAnswerIsNotWaitedForForEver)
 {
-    const TempDir dir;
+    const ScratchDir dir;
     const ListenSocket silent(dir.path("socket"));
     EXPECT_EQ(run({"--socket", dir.path("socket"), "--timeout", "0.05", "status"}),
               (Outcome{3, "",
@@ -795,7 +781,7 @@ TEST(OvctlWithoutDaemonTest, AWrongCommandLineIsAUsageError)
                                                   {"--timeout", "soon", "status"},
                                                   {"--socket", "", "status"}}) {
         const Outcome outcome = run(words);
-        EXPECT_EQ(outcome.exit, 2) << words[0];
+        EXPECT_EQ(outcome.exit_code, 2) << words[0];
         EXPECT_EQ(outcome.out, "");
         EXPECT_TRUE(outcome.err.ends_with(hint)) << outcome.err;
     }
@@ -804,19 +790,19 @@ TEST(OvctlWithoutDaemonTest, AWrongCommandLineIsAUsageError)
 TEST(OvctlWithoutDaemonTest, TellsItsVersion)
 {
     const Outcome version = run({"--version"});
-    EXPECT_EQ(version.exit, 0);
+    EXPECT_EQ(version.exit_code, 0);
     EXPECT_EQ(version.out, "1.0.0\n");
 }
 
 TEST(OvctlWithoutDaemonTest, HelpListsCommandsExamplesAndExitCodes)
 {
     const Outcome all = run({"--help"});
-    EXPECT_EQ(all.exit, 0);
+    EXPECT_EQ(all.exit_code, 0);
     for (const char *word : {"get", "set", "delete", "load", "check", "commit", "diff", "discard",
                              "status", "show", "--socket", "--json", "OVCTL_SOCKET", "Exit codes:"})
         EXPECT_NE(all.out.find(word), std::string::npos) << word;
     const Outcome one = run({"commit", "--help"});
-    EXPECT_EQ(one.exit, 0);
+    EXPECT_EQ(one.exit_code, 0);
     EXPECT_NE(one.out.find("--comment TEXT"), std::string::npos) << one.out;
     EXPECT_NE(one.out.find("Example:\n  ovctl commit"), std::string::npos) << one.out;
 }

@@ -1,10 +1,10 @@
 // ovctl watch: host/ovctl/follow.h.
 
-#include "tests/control/eventually.h"
-#include "tests/control/process.h"
-#include "tests/control/pty.h"
 #include "tests/control/raw_client.h"
 #include "tests/control/test_server.h"
+#include "tests/support/eventually.h"
+#include "tests/support/process.h"
+#include "tests/support/pty.h"
 
 #include <gtest/gtest.h>
 
@@ -19,9 +19,9 @@ namespace
 {
 
 using nlohmann::json;
-using test::eventually;
-using test::Process;
-using test::PtyProcess;
+using ovtest::eventually;
+using ovtest::Process;
+using ovtest::PtyProcess;
 using test::TestServer;
 
 json commit_event(int number, json changes)

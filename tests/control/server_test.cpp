@@ -3,9 +3,9 @@
 
 #include "host/control/server.h"
 
-#include "tests/control/eventually.h"
 #include "tests/control/raw_client.h"
 #include "tests/control/test_server.h"
+#include "tests/support/eventually.h"
 
 #include <gtest/gtest.h>
 #include <pwd.h>
@@ -23,7 +23,7 @@ namespace
 {
 
 using nlohmann::json;
-using test::eventually;
+using ovtest::eventually;
 using test::RawClient;
 using test::TestServer;
 

@@ -5,10 +5,11 @@
 #include "host/ovctl/progress.h"
 #include "host/ovctl/table.h"
 #include "host/ovctl/text_width.h"
-#include "tests/control/process.h"
-#include "tests/control/pty.h"
-#include "tests/control/temp_dir.h"
 #include "tests/control/test_server.h"
+#include "tests/support/files.h"
+#include "tests/support/process.h"
+#include "tests/support/pty.h"
+#include "tests/support/scratch_dir.h"
 
 #include <gmock/gmock.h>
 #include <gtest/gtest.h>
@@ -25,10 +26,10 @@ namespace
 {
 
 using nlohmann::json;
+using ovtest::Process;
+using ovtest::PtyProcess;
+using ovtest::ScratchDir;
 using std::chrono::milliseconds;
-using test::Process;
-using test::PtyProcess;
-using test::TempDir;
 using test::TestServer;
 using testing::HasSubstr;
 using testing::Not;
@@ -116,10 +117,7 @@ class ProgressTest : public testing::Test
   protected:
     void SetUp() override { set_terminal(stream_, {.width = 40}); }
 
-    ProgressLine::Clock::time_point after(int count) const
-    {
-        return began_ + milliseconds(count);
-    }
+    ProgressLine::Clock::time_point after(int count) const { return began_ + milliseconds(count); }
 
     std::ostringstream stream_;
     ProgressLine::Clock::time_point began_ = ProgressLine::Clock::now();
@@ -245,7 +243,7 @@ TEST_F(OvctlAtATerminalTest, EachStreamIsJudgedByItself)
 {
     EXPECT_EQ(shown({"get", "/a"}, 80), "\x1b[31mmgmtd refused the query:\x1b[0m no node /a\n");
     EXPECT_EQ(exit_, 1);
-    const TempDir dir;
+    const ScratchDir dir;
     const std::string to_file = R"(exec "$@" >')" + dir.path("out") + "'";
     std::vector<std::string> words{"/bin/sh", "-c", to_file, "sh"};
     for (const std::string &word : command({"diff"}))
@@ -253,13 +251,13 @@ TEST_F(OvctlAtATerminalTest, EachStreamIsJudgedByItself)
     PtyProcess process(words, 80);
     EXPECT_EQ(process.read_to_end(), 0);
     EXPECT_EQ(process.shown(), "");
-    EXPECT_EQ(test::read_file(dir.path("out")), "+ /a uint32 5\n");
+    EXPECT_EQ(ovtest::read_file(dir.path("out")), "+ /a uint32 5\n");
 }
 
 TEST_F(OvctlAtATerminalTest, ALongLoadTellsHowFarItIs)
 {
-    const TempDir dir;
-    test::write_file(dir.path("site.db"), "/a,uint32,5\n");
+    const ScratchDir dir;
+    ovtest::write_file(dir.path("site.db"), "/a,uint32,5\n");
     answer_ = {{"set", 1}, {"removed", 0}};
     work_ = milliseconds(1300);
     const std::string file = dir.path("site.db");

@@ -3,7 +3,7 @@
 
 #include "host/control/event_loop.h"
 #include "host/control/server.h"
-#include "tests/control/temp_dir.h"
+#include "tests/support/scratch_dir.h"
 
 #include <nlohmann/json.hpp>
 
@@ -56,7 +56,7 @@ class TestServer : private RequestHandler
   private:
     nlohmann::json handle(const nlohmann::json &request, const ClientInfo &client) override;
 
-    TempDir dir_;
+    ovtest::ScratchDir dir_;
     std::string path_;
     Handler handler_;
     std::mutex log_mutex_;

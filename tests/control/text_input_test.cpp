@@ -2,7 +2,8 @@
 
 #include "host/ovctl/text_input.h"
 
-#include "tests/control/temp_dir.h"
+#include "tests/support/files.h"
+#include "tests/support/scratch_dir.h"
 
 #include <gtest/gtest.h>
 
@@ -88,11 +89,11 @@ TEST(TextInputTest, ANumberIsInItsRange)
 
 TEST(TextInputTest, AFileIsReadWhole)
 {
-    const test::TempDir dir;
+    const ovtest::ScratchDir dir;
     std::string text;
     for (int i = 0; i < 50000; ++i)
         text += std::to_string(i) + "\n";
-    test::write_file(dir.path("f"), text);
+    ovtest::write_file(dir.path("f"), text);
     EXPECT_EQ(read_text(dir.path("f")), text);
 }
 

@@ -2,9 +2,9 @@
 
 #include "host/control/client.h"
 #include "host/control/server.h"
-#include "tests/control/eventually.h"
 #include "tests/control/raw_client.h"
 #include "tests/control/test_server.h"
+#include "tests/support/eventually.h"
 
 #include <gtest/gtest.h>
 
@@ -17,7 +17,7 @@ namespace
 {
 
 using nlohmann::json;
-using test::eventually;
+using ovtest::eventually;
 using test::RawClient;
 using test::TestServer;
 

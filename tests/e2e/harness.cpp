@@ -26,20 +26,6 @@ std::string binding(const std::string &name, const std::string &type, const std:
 
 } // namespace
 
-void PrintTo(const Outcome &outcome, std::ostream *stream)
-{
-    *stream << "exit code " << outcome.exit_code << "\n--- out\n"
-            << outcome.out << "--- err\n"
-            << outcome.err << "---";
-}
-
-Outcome run(const Words &argv, const std::string &input)
-{
-    Process process(argv, input);
-    const int exit_code = process.wait();
-    return {exit_code, process.out(), process.err()};
-}
-
 std::vector<std::string> lines_of(const std::string &text)
 {
     std::vector<std::string> lines;
@@ -59,20 +45,9 @@ std::vector<std::string> log_lines(const std::string &log)
     return lines;
 }
 
-std::string read_file(const std::string &path)
-{
-    return ovhost::test::read_file(path);
-}
-
 bool exists(const std::string &path)
 {
     return fs::exists(path);
-}
-
-void write_file(const std::string &path, const std::string &text)
-{
-    fs::create_directories(fs::path(path).parent_path());
-    ovhost::test::write_file(path, text);
 }
 
 std::string event_line(const std::string &kind, const std::string &node, const char *new_value,

@@ -1,9 +1,9 @@
 #pragma once
 // The real processes at work: a daemon, its client and its peer in a directory of the test's own.
 
-#include "tests/control/eventually.h"
-#include "tests/control/process.h"
-#include "tests/store/scratch_dir.h"
+#include "tests/support/eventually.h"
+#include "tests/support/process.h"
+#include "tests/support/scratch_dir.h"
 
 #include <gmock/gmock.h>
 #include <gtest/gtest.h>
@@ -15,32 +15,13 @@
 namespace e2e
 {
 
-using ovhost::test::Process;
+using ovtest::eventually;
+using ovtest::Outcome;
+using ovtest::Process;
+using ovtest::read_file;
+using ovtest::run;
+using ovtest::write_file;
 using Words = std::vector<std::string>;
-
-/// True as soon as `condition` is; false when it is not within a minute, which is for processes on
-/// a busy machine.
-template <typename Condition>
-[[nodiscard]] bool eventually(Condition condition)
-{
-    for (int tries = 0; tries < 6; ++tries) {
-        if (ovhost::test::eventually(condition)) {
-            return true;
-        }
-    }
-    return false;
-}
-
-/// How a process ended, and what it said.
-struct Outcome {
-    int exit_code = -1;
-    std::string out;
-    std::string err;
-
-    bool operator==(const Outcome &) const = default;
-};
-
-void PrintTo(const Outcome &outcome, std::ostream *stream);
 
 [[nodiscard]] inline Outcome done(const std::string &out = {})
 {
@@ -53,17 +34,13 @@ void PrintTo(const Outcome &outcome, std::ostream *stream);
     return {1, {}, err};
 }
 
-[[nodiscard]] Outcome run(const Words &argv, const std::string &input = {});
-
 /// Each line of a text.
 [[nodiscard]] std::vector<std::string> lines_of(const std::string &text);
 
 /// A log's lines without the time: "LEVEL UNIT FUNCTION: TEXT".
 [[nodiscard]] std::vector<std::string> log_lines(const std::string &log);
 
-[[nodiscard]] std::string read_file(const std::string &path);
 [[nodiscard]] bool exists(const std::string &path);
-void write_file(const std::string &path, const std::string &text);
 
 /// The line that jsond writes for a change; an old or new value of null is not in it.
 [[nodiscard]] std::string event_line(const std::string &kind, const std::string &node,
@@ -106,7 +83,10 @@ class E2eTest : public testing::Test
     [[nodiscard]] std::unique_ptr<Process> start_jsond(const Words &more = {}) const;
 
     /// Lines of the events file.
-    [[nodiscard]] std::vector<std::string> events() const { return lines_of(read_file(events_)); }
+    [[nodiscard]] std::vector<std::string> events() const
+    {
+        return lines_of(read_file(events_).value_or(""));
+    }
 
     /// Waits until jsond has written so many events; all there are then.
     [[nodiscard]] std::vector<std::string> await_events(std::size_t count) const;

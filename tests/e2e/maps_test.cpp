@@ -117,7 +117,7 @@ TEST_F(Maps, OfALegacyConfigurationAreUpgraded)
 {
     install_samples();
     start({"--model", "branch-100"});
-    const std::string before = read_file(sample);
+    const std::string before = read_file(sample).value();
     const Outcome outcome = ovctl({"upgrade", sample});
     ASSERT_EQ(outcome.exit_code, 0) << outcome.err;
     EXPECT_EQ(read_file(sample), before);

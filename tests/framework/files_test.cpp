@@ -3,6 +3,8 @@
 #include "tests/framework/allocation_failure.h"
 #include "tests/framework/log_capture.h"
 #include "tests/framework/owned.h"
+#include "tests/support/files.h"
+#include "tests/support/scratch_dir.h"
 
 #include <fcntl.h>
 #include <sys/stat.h>
@@ -27,18 +29,11 @@ using testing::IsEmpty;
 class Files : public testing::Test
 {
   protected:
-    Files()
-    {
-        std::string pattern = testing::TempDir() + "files_test.XXXXXX";
-        dir = ::mkdtemp(pattern.data());
-    }
-    ~Files() override { std::filesystem::remove_all(dir); }
-
-    [[nodiscard]] std::string path(const char *name) const { return (dir / name).string(); }
+    [[nodiscard]] std::string path(const char *name) const { return dir.path(name); }
 
     std::string write(const char *name, std::string_view content) const
     {
-        std::ofstream(path(name), std::ios::binary) << content;
+        ovtest::write_file(path(name), std::string(content));
         return path(name);
     }
 
@@ -49,7 +44,7 @@ class Files : public testing::Test
         return texts_of(lines);
     }
 
-    std::filesystem::path dir;
+    ovtest::ScratchDir dir;
 };
 
 TEST_F(Files, ExistsTellsWhatIsThere)
@@ -58,7 +53,7 @@ TEST_F(Files, ExistsTellsWhatIsThere)
     EXPECT_EQ(lf_test_exists(write("there", "").c_str(), &exists), 0);
     EXPECT_TRUE(exists);
     exists = false;
-    EXPECT_EQ(lf_test_exists(dir.c_str(), &exists), 0);
+    EXPECT_EQ(lf_test_exists(dir.path().c_str(), &exists), 0);
     EXPECT_TRUE(exists);
 }
 
@@ -165,7 +160,7 @@ TEST_F(Files, ReadSaysWhatFailed)
     OwnedStrings lines;
     EXPECT_EQ(lf_read_file_lines(path("none").c_str(), lines.out()), 14013);
     EXPECT_EQ(lf_read_file_lines(path("none/deeper").c_str(), lines.out()), 14013);
-    EXPECT_EQ(lf_read_file_lines(dir.c_str(), lines.out()), 14014);
+    EXPECT_EQ(lf_read_file_lines(dir.path().c_str(), lines.out()), 14014);
     std::filesystem::create_symlink("loop", path("loop"));
     EXPECT_EQ(lf_read_file_lines(path("loop").c_str(), lines.out()), 14014);
     EXPECT_EQ(lf_read_file_lines(nullptr, lines.out()), 14001);

@@ -7,9 +7,6 @@
 #include "host/tree/name.h"
 
 #include <filesystem>
-#include <fstream>
-#include <iterator>
-#include <stdexcept>
 
 namespace mgmtd_test
 {
@@ -65,24 +62,6 @@ std::vector<std::string> refusals_of(const std::vector<Refusal> &refusals)
         texts.push_back(refusal.node + ": " + refusal.message + " (" + refusal.module + ")");
     }
     return texts;
-}
-
-void write_file(const std::string &path, const std::string &text)
-{
-    std::ofstream file(path, std::ios::binary);
-    file << text;
-    if (!file.flush()) {
-        throw std::runtime_error("cannot write " + path);
-    }
-}
-
-std::optional<std::string> read_file(const std::string &path)
-{
-    std::ifstream file(path, std::ios::binary);
-    if (!file) {
-        return std::nullopt;
-    }
-    return std::string(std::istreambuf_iterator<char>(file), {});
 }
 
 } // namespace mgmtd_test

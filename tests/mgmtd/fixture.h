@@ -4,12 +4,12 @@
 
 #include "host/mgmtd/configuration.h"
 #include "tests/framework/log_capture.h"
-#include "tests/store/scratch_dir.h"
+#include "tests/support/files.h"
+#include "tests/support/scratch_dir.h"
 
 #include <gmock/gmock.h>
 #include <gtest/gtest.h>
 
-#include <optional>
 #include <string>
 #include <vector>
 
@@ -20,6 +20,9 @@ inline constexpr const char *model_file = "/opt/orvale/defdb.conf.m1";
 inline constexpr const char *debug_file = "/var/opt/tms/.debug_default_db";
 inline constexpr const char *preserved_file = "/var/opt/tms/.preserved_db";
 inline constexpr const char *limits_file = "/var/opt/tms/dynalimits.conf";
+
+using ovtest::read_file;
+using ovtest::write_file;
 
 class DaemonTest : public testing::Test
 {
@@ -41,10 +44,5 @@ class DaemonTest : public testing::Test
 
 /// "NODE: MESSAGE (MODULE)" for each refusal.
 [[nodiscard]] std::vector<std::string> refusals_of(const std::vector<ovhost::Refusal> &refusals);
-
-void write_file(const std::string &path, const std::string &text);
-
-/// Nothing when there is no such file.
-[[nodiscard]] std::optional<std::string> read_file(const std::string &path);
 
 } // namespace mgmtd_test

@@ -4,7 +4,7 @@
 #include "host/control/event_loop.h"
 #include "host/control/server.h"
 #include "host/framework/sessions.h"
-#include "tests/store/scratch_dir.h"
+#include "tests/support/scratch_dir.h"
 
 #include <gtest/gtest.h>
 #include <nlohmann/json.hpp>

@@ -2,8 +2,10 @@
 
 #include "host/ovctl/command_table.h"
 #include "packaging/texts/command_words.h"
-#include "tests/control/pty.h"
 #include "tests/packaging/shell.h"
+#include "tests/support/files.h"
+#include "tests/support/pty.h"
+#include "tests/support/scratch_dir.h"
 
 #include <gmock/gmock.h>
 #include <gtest/gtest.h>
@@ -17,8 +19,8 @@ namespace
 {
 
 using namespace ovhost;
-using ovhost::test::PtyProcess;
-using ovhost::test::TempDir;
+using ovtest::PtyProcess;
+using ovtest::ScratchDir;
 using packaging_test::Outcome;
 using packaging_test::run;
 using testing::Contains;
@@ -106,9 +108,9 @@ TEST(BashCompletion, PassesOverOptionsAndTheirValues)
 
 TEST(BashCompletion, OffersFilesWhereAFileIsNeeded)
 {
-    const TempDir dir;
+    const ScratchDir dir;
     const std::string file = dir.path("site one.db");
-    ovhost::test::write_file(file, "");
+    ovtest::write_file(file, "");
     const std::string begun = dir.path("si");
     for (const char *command : {"load", "upgrade"})
         EXPECT_THAT(offered_by_bash({"ovctl", command, begun}), ElementsAre(file)) << command;
@@ -180,9 +182,9 @@ TEST(ZshCompletion, CompletesCommandsGroupsAndOptions)
 
 TEST(ZshCompletion, CompletesFiles)
 {
-    const TempDir dir;
+    const ScratchDir dir;
     const std::string file = dir.path("site.db");
-    ovhost::test::write_file(file, "");
+    ovtest::write_file(file, "");
     EXPECT_EQ(shown_by_zsh("ovctl load " + dir.path("si"), file + " "), file + " ");
     EXPECT_EQ(shown_by_zsh("ovctl --socket " + dir.path("si"), file + " "), file + " ");
     EXPECT_EQ(shown_by_zsh("ovctl --socket=" + dir.path("si"), file + " "), file + " ");
@@ -196,7 +198,7 @@ TEST(ZshCompletion, ListsWhatCommandsAreFor)
 
 TEST(ZshCompletionText, HasEveryCommandAndOptionOfTheTable)
 {
-    const std::string text = ovhost::test::read_file(std::string(OVMD_ZSH_FOLDER) + "/_ovctl");
+    const std::string text = ovtest::read_file(OVMD_ZSH_FOLDER "/_ovctl").value();
     for (const Command &command : commands()) {
         const Words words = split(command.name);
         EXPECT_NE(text.find("'" + words.back() + ":"), std::string::npos) << command.name;

@@ -1,6 +1,8 @@
 // The systemd units, checked by systemd itself: packaging/*.service.in.
 
 #include "tests/packaging/shell.h"
+#include "tests/support/files.h"
+#include "tests/support/scratch_dir.h"
 
 #include <gmock/gmock.h>
 #include <gtest/gtest.h>
@@ -10,9 +12,9 @@
 namespace
 {
 
-using ovhost::test::read_file;
-using ovhost::test::TempDir;
-using ovhost::test::write_file;
+using ovtest::read_file;
+using ovtest::ScratchDir;
+using ovtest::write_file;
 using packaging_test::Outcome;
 using packaging_test::run;
 using testing::HasSubstr;
@@ -30,7 +32,7 @@ class Units : public testing::Test
     void write_unit(const std::string &name, const std::string &program) const
     {
         const std::string place = "@" + name + "_program@";
-        std::string text = read_file(OVMD_PACKAGING "/" + name + ".service.in");
+        std::string text = read_file(OVMD_PACKAGING "/" + name + ".service.in").value();
         const std::size_t at = text.find(place);
         ASSERT_NE(at, std::string::npos);
         text.replace(at, place.size(), program);
@@ -39,7 +41,7 @@ class Units : public testing::Test
 
     std::string file_of(const std::string &name) const { return dir_.path(name + ".service"); }
 
-    TempDir dir_;
+    ScratchDir dir_;
 };
 
 Outcome verify(const std::string &one, const std::string &other)
@@ -54,7 +56,8 @@ TEST_F(Units, SystemdFindsNothingWrong)
 
 TEST_F(Units, SystemdWouldFindAMistake)
 {
-    write_file(file_of("mgmtd"), read_file(file_of("mgmtd")) + "[Service]\nRestrat=always\n");
+    write_file(file_of("mgmtd"),
+               read_file(file_of("mgmtd")).value() + "[Service]\nRestrat=always\n");
     EXPECT_THAT(verify(file_of("mgmtd"), file_of("jsond")).err, HasSubstr("Restrat"));
 }
 
@@ -78,8 +81,8 @@ TEST(SystemUsers, AreWhatSystemdUnderstands)
 TEST(DataPlaneFolders, AreMadeWithTheirOwner)
 {
     // Below a root of its own, in which the owner is known by number.
-    const TempDir root;
-    std::string text = read_file(OVMD_PACKAGING "/mgmtd.tmpfiles");
+    const ScratchDir root;
+    std::string text = read_file(OVMD_PACKAGING "/mgmtd.tmpfiles").value();
     for (std::size_t at = text.find("mgmtd mgmtd"); at != std::string::npos;
          at = text.find("mgmtd mgmtd"))
         text.replace(at, 11, "- -");

@@ -4,8 +4,8 @@
 #include <gtest/gtest.h>
 
 #include "host/store/store.h"
-#include "tests/store/scratch_dir.h"
 #include "tests/store/store_testing.h"
+#include "tests/support/scratch_dir.h"
 
 namespace
 {

@@ -23,7 +23,7 @@
 #include <thread>
 
 #include "tests/store/child.h"
-#include "tests/store/scratch_dir.h"
+#include "tests/support/scratch_dir.h"
 
 namespace
 {

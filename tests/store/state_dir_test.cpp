@@ -9,8 +9,8 @@
 
 #include "host/store/store_error.h"
 #include "tests/store/child.h"
-#include "tests/store/scratch_dir.h"
 #include "tests/store/store_testing.h"
+#include "tests/support/scratch_dir.h"
 
 namespace
 {

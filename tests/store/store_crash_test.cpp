@@ -10,8 +10,8 @@
 #include <random>
 
 #include "host/store/store.h"
-#include "tests/store/scratch_dir.h"
 #include "tests/store/store_testing.h"
+#include "tests/support/scratch_dir.h"
 
 namespace
 {

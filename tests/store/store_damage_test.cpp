@@ -10,8 +10,8 @@
 
 #include "host/store/store.h"
 #include "tests/store/child.h"
-#include "tests/store/scratch_dir.h"
 #include "tests/store/store_testing.h"
+#include "tests/support/scratch_dir.h"
 
 namespace
 {
@@ -102,7 +102,7 @@ TEST_F(StoreDamage, ATextFile)
 TEST_F(StoreDamage, AFileCutAnywhere)
 {
     make_store(300);
-    const std::string whole = read_file(file_);
+    const std::string whole = read_file(file_).value();
     ASSERT_GE(whole.size(), 4 * kPage);
     for (std::size_t size = 100; size < whole.size(); size += kPage / 2) {
         write_file(file_, whole.substr(0, size));
@@ -117,7 +117,7 @@ TEST_F(StoreDamage, AFileCutAnywhere)
 TEST_F(StoreDamage, AnyPageOverwritten)
 {
     make_store(300);
-    const std::string whole = read_file(file_);
+    const std::string whole = read_file(file_).value();
     for (std::size_t page = 0; page < whole.size(); page += kPage) {
         std::string bytes = whole;
         const std::size_t begin = page == 0 ? 100 : page;
@@ -132,7 +132,7 @@ TEST_F(StoreDamage, AnyPageOverwritten)
 TEST_F(StoreDamage, AHeaderOfGarbage)
 {
     make_store();
-    std::string bytes = read_file(file_);
+    std::string bytes = read_file(file_).value();
     bytes.replace(0, 100, 100, '\xa5');
     write_file(file_, bytes);
     EXPECT_EQ(refused(), foreign("it does not begin like an SQLite database"));
@@ -351,7 +351,7 @@ TEST_F(StoreDamage, APageFoundDamagedInACommitLeavesTheStoreAsItWas)
     }
     {
         Store store = Store::open(scratch_.path());
-        const std::string whole = read_file(file_);
+        const std::string whole = read_file(file_).value();
         overwrite(file_, whole.substr(0, kPage) + std::string(whole.size() - kPage, '\xa5'));
         EXPECT_THROW(store.commit(numbered(20'000, "y")), ovhost::StoreError);
         // The commit number's page is in memory since the start.

@@ -17,8 +17,8 @@
 
 #include "host/store/store.h"
 #include "tests/store/child.h"
-#include "tests/store/scratch_dir.h"
 #include "tests/store/store_testing.h"
+#include "tests/support/scratch_dir.h"
 
 namespace
 {

@@ -5,8 +5,8 @@
 
 #include <type_traits>
 
-#include "tests/store/scratch_dir.h"
 #include "tests/store/store_testing.h"
+#include "tests/support/scratch_dir.h"
 
 namespace
 {

@@ -2,8 +2,6 @@
 
 #include <sqlite3.h>
 
-#include <fstream>
-#include <iterator>
 #include <stdexcept>
 
 namespace ovtest
@@ -48,22 +46,6 @@ std::string refusal(const fs::path &dir)
     }
 }
 
-std::string read_file(const fs::path &file)
-{
-    std::ifstream in(file, std::ios::binary);
-    if (!in)
-        throw std::runtime_error("cannot read " + file.string());
-    return {std::istreambuf_iterator<char>(in), std::istreambuf_iterator<char>()};
-}
-
-void write_file(const fs::path &file, const std::string &bytes)
-{
-    std::ofstream out(file, std::ios::binary | std::ios::trunc);
-    out << bytes;
-    if (!out.flush())
-        throw std::runtime_error("cannot write " + file.string());
-}
-
 Files files_of(const fs::path &dir)
 {
     Files files;
@@ -72,7 +54,7 @@ Files files_of(const fs::path &dir)
         if (!entry.is_regular_file() || name == "lock")
             continue;
         if (entry.file_size() != 0)
-            files[name] = read_file(entry.path());
+            files[name] = read_file(entry.path()).value();
     }
     return files;
 }

@@ -8,6 +8,7 @@
 #include <vector>
 
 #include "host/store/store.h"
+#include "tests/support/files.h"
 
 namespace ovtest
 {
@@ -27,9 +28,6 @@ using Files = std::map<std::string, std::string>;
 
 // The message opening this directory is refused with; "" when it is not refused.
 [[nodiscard]] std::string refusal(const std::filesystem::path &dir);
-
-[[nodiscard]] std::string read_file(const std::filesystem::path &file);
-void write_file(const std::filesystem::path &file, const std::string &bytes);
 
 // Every regular file of a directory and its bytes, but for the lock file and empty files.
 [[nodiscard]] Files files_of(const std::filesystem::path &dir);

@@ -10,7 +10,6 @@
 #include <algorithm>
 #include <cstdlib>
 #include <filesystem>
-#include <fstream>
 #include <iterator>
 #include <stdexcept>
 
@@ -109,24 +108,6 @@ void HostFixture::set_time(uint64 ms_since_boot)
 {
     time_.time_since_boot_ms = ms_since_boot;
     time_info_ptr = &time_;
-}
-
-void write_file(const std::string &path, const std::string &text)
-{
-    std::ofstream file(path, std::ios::binary);
-    file << text;
-    if (!file.flush()) {
-        throw std::runtime_error("cannot write " + path);
-    }
-}
-
-std::optional<std::string> read_file(const std::string &path)
-{
-    std::ifstream file(path, std::ios::binary);
-    if (!file) {
-        return std::nullopt;
-    }
-    return std::string(std::istreambuf_iterator<char>(file), {});
 }
 
 std::string taken(char *text)

@@ -6,8 +6,8 @@
 
 #include "framework/sys_time.h"
 #include "host/framework/objects.h"
+#include "tests/support/files.h"
 
-#include <optional>
 #include <string>
 #include <vector>
 
@@ -66,11 +66,6 @@ class HostFixture
     TestSession jsond_;
     time_info time_ = {};
 };
-
-void write_file(const std::string &path, const std::string &text);
-
-// Nothing when there is no such file.
-std::optional<std::string> read_file(const std::string &path);
 
 // A text that the library handed out, which is freed; "null" when there is none.
 std::string taken(char *text);

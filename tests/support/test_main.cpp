@@ -1,7 +1,8 @@
-// The main program of tests that call the library: the library's fixed directories are the
-// program's own before the first test runs.
+// The main program of tests that call the library: the library's fixed directories and the kernel's
+// network interfaces are the program's own before the first test runs.
 #include "host/mgmtd/private_root.h"
-#include "tests/store/scratch_dir.h"
+#include "tests/support/private_network.h"
+#include "tests/support/scratch_dir.h"
 
 #include <gmock/gmock.h>
 #include <gtest/gtest.h>
@@ -16,6 +17,7 @@ int main(int argc, char **argv)
         return RUN_ALL_TESTS();
     }
     try {
+        ovtest::enter_private_network();
         const ovtest::ScratchDir root;
         ovhost::enter_private_root(root.path());
         return RUN_ALL_TESTS();

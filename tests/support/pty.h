@@ -6,7 +6,7 @@
 #include <string>
 #include <vector>
 
-namespace ovhost::test
+namespace ovtest
 {
 
 class PtyProcess
@@ -46,4 +46,4 @@ class PtyProcess
     std::string bytes_;
 };
 
-} // namespace ovhost::test
+} // namespace ovtest

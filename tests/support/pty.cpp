@@ -1,6 +1,6 @@
-#include "tests/control/pty.h"
+#include "tests/support/pty.h"
 
-#include "tests/control/eventually.h"
+#include "tests/support/eventually.h"
 
 #include <poll.h>
 #include <pty.h>
@@ -14,7 +14,7 @@
 #include <cstdlib>
 #include <system_error>
 
-namespace ovhost::test
+namespace ovtest
 {
 
 namespace
@@ -130,4 +130,4 @@ std::string PtyProcess::shown() const
     return text;
 }
 
-} // namespace ovhost::test
+} // namespace ovtest

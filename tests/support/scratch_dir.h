@@ -3,10 +3,11 @@
 
 #include <sys/stat.h>
 
+#include <cerrno>
 #include <cstdlib>
 #include <filesystem>
-#include <stdexcept>
 #include <string>
+#include <system_error>
 
 namespace ovtest
 {
@@ -17,8 +18,9 @@ class ScratchDir
     ScratchDir()
     {
         std::string name = (std::filesystem::temp_directory_path() / "ovmd-test-XXXXXX").string();
-        if (::mkdtemp(name.data()) == nullptr)
-            throw std::runtime_error("mkdtemp " + name);
+        if (::mkdtemp(name.data()) == nullptr) {
+            throw std::system_error(errno, std::generic_category(), name);
+        }
         path_ = name;
         // Children of the tests that run as another user come here too.
         ::chmod(name.c_str(), 0755);
@@ -35,6 +37,12 @@ class ScratchDir
     [[nodiscard]] std::filesystem::path operator/(const std::string &name) const
     {
         return path_ / name;
+    }
+
+    // As text, which is what programs take.
+    [[nodiscard]] std::string path(const std::string &name) const
+    {
+        return (path_ / name).string();
     }
 
   private:
