@@ -1,6 +1,6 @@
 #include "host/modules/match_strings.h"
 
-#include "framework/appliance.h"
+#include "host/framework/match_string.h"
 #include "host/modules/acl_nodes.h"
 #include "host/modules/acl_references.h"
 #include "host/modules/commit_access.h"
@@ -20,18 +20,12 @@ constexpr int bad_vlan = -1;
 
 bool matches_vlan(const std::string &text, const std::string &name)
 {
-    tstr_array *keys = nullptr;
-    tstr_array *values = nullptr;
-    char *reason = nullptr;
-    const int err = ov_acl_validate_matchstr(text.c_str(), &keys, &values, &reason);
-    const TstrArrayPtr owned_keys(keys);
-    const TstrArrayPtr owned_values(values);
-    const TextPtr owned_reason(reason);
-    const auto count =
-        err == 0 && keys != nullptr ? static_cast<uint32>(tstr_array_length_quick(keys)) : 0;
-    for (uint32 i = 0; i < count; ++i) {
-        if (::strcasecmp(tstr_array_get_str_quick(keys, i), "vlan") == 0 &&
-            name == tstr_array_get_str_quick(values, i)) {
+    MatchString match;
+    if (parse_match_string(text, match)) {
+        return false;
+    }
+    for (std::size_t i = 0; i < match.keys.size(); ++i) {
+        if (::strcasecmp(match.keys[i].c_str(), "vlan") == 0 && match.values[i] == name) {
             return true;
         }
     }
