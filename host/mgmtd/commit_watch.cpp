@@ -1,8 +1,8 @@
 #include "host/mgmtd/commit_watch.h"
 
 #include "framework/logging.h"
-#include "host/framework/log_config.h"
 #include "host/mgmtd/configuration.h"
+#include "host/mgmtd/daemon_log.h"
 #include "host/mgmtd/history_requests.h"
 #include "host/store/store_error.h"
 
@@ -38,9 +38,9 @@ void CommitWatch::report(std::uint64_t number)
             watchers_.report(*event);
         }
     } catch (const StoreError &error) {
-        log_host_line(ov_log_warning, "mgmtd",
-                      "commit " + std::to_string(number) +
-                          " is stored, but cannot be told to those who watch: " + error.what());
+        log_line(ov_log_warning,
+                 "commit " + std::to_string(number) +
+                     " is stored, but cannot be told to those who watch: " + error.what());
     }
 }
 

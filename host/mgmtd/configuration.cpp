@@ -4,9 +4,9 @@
 #include "framework/logging.h"
 #include "host/commit/past.h"
 #include "host/framework/appliance_config.h"
-#include "host/framework/log_config.h"
 #include "host/framework/model_nodes.h"
 #include "host/framework/time_refresh.h"
+#include "host/mgmtd/daemon_log.h"
 #include "host/mgmtd/rollback_target.h"
 #include "host/modules/default_values.h"
 #include "host/modules/node_access.h"
@@ -19,11 +19,6 @@ namespace ovhost
 namespace
 {
 
-void log_line(int level, const std::string &text)
-{
-    log_host_line(level, "mgmtd", text);
-}
-
 DefaultsReport logged_defaults()
 {
     return {
@@ -35,15 +30,12 @@ DefaultsReport logged_defaults()
     };
 }
 
-/// What a refused first commit says: every refusal, for there is no client to show them to.
-std::string describe(const CommitReport &report)
+/// What a first commit that was not accepted says: there is no client to show it to.
+std::string describe_first(const CommitReport &report)
 {
-    std::string text = "the first configuration is refused";
-    for (const Refusal &refusal : report.refusals) {
-        text += "\n  " + (refusal.node.empty() ? "" : refusal.node + ": ") + refusal.message +
-                " (" + refusal.module + ")";
-    }
-    return report.outcome == CommitOutcome::not_stored ? report.store_error : text;
+    const bool is_refused = report.outcome == CommitOutcome::refused;
+    return (is_refused ? "the first configuration is refused\n  " : "") +
+           failure_text(report, "\n  ");
 }
 
 /// Defaults and limits would come from two models at the next first start.
@@ -63,28 +55,7 @@ void warn_of_another_model(const mdb_db &configuration)
 Configuration::Configuration(const std::filesystem::path &state_dir, const HistoryBounds &history)
     : store_(Store::open(state_dir, history)), adapter_(store_), engine_(adapter_)
 {
-    // Order counts: checks refuse before anything follows, and events tell of what is done.
-    engine_.add_module(schema_);
-    engine_.add_module(name_depth_);
-    engine_.add_module(model_);
-    engine_.add_module(tunnels_);
-    // Maps look for the ACLs that they name.
-    engine_.add_module(acls_);
-    engine_.add_module(applications_);
-    engine_.add_module(interfaces_);
-    engine_.add_module(interface_users_);
-    engine_.add_module(routes_);
-    engine_.add_module(addresses_);
-    engine_.add_module(interface_budget_);
-    engine_.add_module(vlans_);
-    engine_.add_module(labels_);
-    engine_.add_module(preferred_interfaces_);
-    for (MapsModule &maps : maps_) {
-        engine_.add_module(maps);
-    }
-    engine_.add_module(dns_proxy_maps_);
-    engine_.add_module(limits_);
-    engine_.add_module(events_);
+    modules_.add_to(engine_);
     engine_.load();
     candidate_.discard(engine_.running());
     set_running_db_source([this] { return running_db(); });
@@ -120,7 +91,7 @@ void Configuration::commit_first()
 {
     const CommitReport report = engine_.initial(candidate_, daemon_note("initial configuration"));
     if (!report.accepted()) {
-        throw std::runtime_error(describe(report));
+        throw std::runtime_error(describe_first(report));
     }
     for (const Warning &warning : report.warnings) {
         log_line(ov_log_warning, warning.message);

@@ -6,28 +6,12 @@
 #include "host/commit/engine.h"
 #include "host/framework/objects.h"
 #include "host/mgmtd/confirmations.h"
-#include "host/modules/acls.h"
-#include "host/modules/applications.h"
-#include "host/modules/change_events.h"
-#include "host/modules/dns_proxy_maps.h"
-#include "host/modules/interface_addresses.h"
-#include "host/modules/interface_budget.h"
-#include "host/modules/interface_users.h"
-#include "host/modules/interfaces.h"
-#include "host/modules/limits.h"
-#include "host/modules/maps.h"
-#include "host/modules/model.h"
-#include "host/modules/name_depth.h"
-#include "host/modules/net_interfaces.h"
-#include "host/modules/routes.h"
-#include "host/modules/schema.h"
-#include "host/modules/tunnels.h"
+#include "host/mgmtd/module_set.h"
 #include "host/store/store.h"
 
 #include <cstdint>
 #include <filesystem>
 #include <string>
-#include <vector>
 
 namespace ovhost
 {
@@ -83,7 +67,7 @@ class Configuration
     [[nodiscard]] Tree after(std::uint64_t commit) const;
 
     /// Tunnel IDs that were freed a short time ago.
-    [[nodiscard]] const HeldIds &held_ids() const { return tunnels_.held_ids(); }
+    [[nodiscard]] const HeldIds &held_ids() const { return modules_.held_ids(); }
 
   private:
     void start_modules(const Tree &configuration);
@@ -91,24 +75,7 @@ class Configuration
 
     Store store_;
     StoreAdapter adapter_;
-    SchemaModule schema_;
-    NameDepthModule name_depth_;
-    ModelModule model_;
-    TunnelsModule tunnels_;
-    AclsModule acls_;
-    ApplicationsModule applications_;
-    NetInterfacesModule interfaces_;
-    InterfaceUsersModule interface_users_;
-    RoutesModule routes_;
-    InterfaceAddressesModule addresses_;
-    InterfaceBudgetModule interface_budget_;
-    VlansModule vlans_;
-    InterfaceLabelsModule labels_;
-    PreferredInterfacesModule preferred_interfaces_;
-    std::vector<MapsModule> maps_{map_kinds.begin(), map_kinds.end()};
-    DnsProxyMapsModule dns_proxy_maps_;
-    LimitsModule limits_;
-    ChangeEventsModule events_;
+    ModuleSet modules_;
     CommitEngine engine_;
     Confirmations confirmations_{store_, engine_};
     Candidate candidate_;

@@ -2,7 +2,7 @@
 
 #include "framework/logging.h"
 #include "host/commit/past.h"
-#include "host/framework/log_config.h"
+#include "host/mgmtd/daemon_log.h"
 #include "host/mgmtd/rollback_target.h"
 #include "host/support/commit_range.h"
 
@@ -15,28 +15,9 @@ namespace ovhost
 namespace
 {
 
-void log_line(int level, const std::string &text)
-{
-    log_host_line(level, "mgmtd", text);
-}
-
 std::string commits_of(const Wait &wait)
 {
     return commit_range(wait.back_to, wait.number);
-}
-
-/// All that a failed commit says, in one line.
-std::string describe(const CommitReport &report)
-{
-    if (report.outcome == CommitOutcome::not_stored) {
-        return report.store_error;
-    }
-    std::string text;
-    for (const Refusal &refusal : report.refusals) {
-        text += (text.empty() ? "" : "; ") + (refusal.node.empty() ? "" : refusal.node + ": ") +
-                refusal.message + " (" + refusal.module + ")";
-    }
-    return text;
 }
 
 CommitReport not_stored(const std::exception &error)
@@ -148,7 +129,7 @@ bool Confirmations::undo_if_due()
     const Wait wait = *wait_;
     const CommitReport report = undo(wait);
     if (!report.accepted()) {
-        put_off(wait, describe(report));
+        put_off(wait, failure_text(report, "; "));
         return false;
     }
     for (const Warning &warning : report.warnings) {

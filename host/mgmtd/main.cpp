@@ -7,6 +7,7 @@
 #include "host/framework/log_config.h"
 #include "host/mgmtd/commit_watch.h"
 #include "host/mgmtd/configuration.h"
+#include "host/mgmtd/daemon_log.h"
 #include "host/mgmtd/options.h"
 #include "host/mgmtd/peer_sessions.h"
 #include "host/mgmtd/private_root.h"
@@ -93,9 +94,9 @@ void run(const DaemonOptions &options)
                                                            server.report(event);
                                                        }});
     undo_timer.set();
-    log_host_line(ov_log_notice, "mgmtd", "ready on " + options.socket);
+    log_line(ov_log_notice, "ready on " + options.socket);
     const int signal = loop.run();
-    log_host_line(ov_log_notice, "mgmtd", "stopping on signal " + std::to_string(signal));
+    log_line(ov_log_notice, "stopping on signal " + std::to_string(signal));
     sessions.reset();
 }
 
