@@ -4,8 +4,6 @@
 #include "host/modules/node_access.h"
 #include "host/tree/name.h"
 
-#include <nlohmann/json.hpp>
-
 namespace ovhost
 {
 
@@ -26,6 +24,16 @@ json change_json(const Change &change)
             {"name", join_name(change.parts)},
             {"old", value_json(change.before)},
             {"new", value_json(change.after)}};
+}
+
+std::vector<ErrorDetail> details_of(const std::vector<LineFault> &faults)
+{
+    std::vector<ErrorDetail> details;
+    details.reserve(faults.size());
+    for (const LineFault &fault : faults) {
+        details.push_back({fault.node, fault.message, "", fault.line});
+    }
+    return details;
 }
 
 } // namespace
@@ -66,6 +74,21 @@ void throw_unless_accepted(const CommitReport &report, const char *refusal)
     if (!report.accepted()) {
         throw_refused(refusal, report.refusals);
     }
+}
+
+void throw_bad_lines(const std::string &source, const std::vector<LineFault> &faults)
+{
+    throw RequestError(error_code::bad_lines,
+                       source + ": " + std::to_string(faults.size()) +
+                           (faults.size() == 1 ? " bad line" : " bad lines") +
+                           "; nothing was loaded",
+                       details_of(faults));
+}
+
+void throw_bad_entries(const std::vector<LineFault> &faults)
+{
+    throw RequestError(error_code::refused, "entries cannot be upgraded; nothing was stored",
+                       details_of(faults));
 }
 
 } // namespace ovhost

@@ -21,14 +21,9 @@ using nlohmann::json;
 
 constexpr std::uint32_t default_limit = 20;
 
-// In the order of the enumeration.
+// In the order of the enumeration. They are the protocol's words, whatever the store's are.
 constexpr std::array confirmation_words{"none", "waiting", "confirmed", "undone"};
-
-template <typename Fact>
-json or_null(const std::optional<Fact> &fact)
-{
-    return fact ? json(*fact) : json();
-}
+static_assert(confirmation_words.size() == static_cast<std::size_t>(Confirmation::undone) + 1);
 
 json confirmation_json(const RecordedCommit &commit)
 {

@@ -4,13 +4,13 @@
 #include "framework/logging.h"
 #include "host/control/arguments.h"
 #include "host/control/server.h"
-#include "host/framework/log_config.h"
 #include "host/framework/time_refresh.h"
 #include "host/mgmtd/answers.h"
+#include "host/mgmtd/daemon_log.h"
 #include "host/mgmtd/history_requests.h"
 #include "host/mgmtd/library_requests.h"
 #include "host/mgmtd/show.h"
-#include "host/modules/legacy_upgrade.h"
+#include "host/mgmtd/upgrade_requests.h"
 #include "host/modules/node_access.h"
 #include "host/support/version.h"
 #include "host/tree/name.h"
@@ -45,31 +45,6 @@ std::size_t count_values(const Tree &tree, Tree::Parts below)
     tree.visit([&count](Tree::Parts, const Value &) { ++count; }, below);
     return count;
 }
-
-std::vector<ErrorDetail> details_of(const std::vector<LineFault> &faults)
-{
-    std::vector<ErrorDetail> details;
-    details.reserve(faults.size());
-    for (const LineFault &fault : faults) {
-        details.push_back({fault.node, fault.message, "", fault.line});
-    }
-    return details;
-}
-
-[[noreturn]] void throw_bad_lines(const std::string &source, const std::vector<LineFault> &faults)
-{
-    throw RequestError(error_code::bad_lines,
-                       source + ": " + std::to_string(faults.size()) +
-                           (faults.size() == 1 ? " bad line" : " bad lines") +
-                           "; nothing was loaded",
-                       details_of(faults));
-}
-
-/// Drops the candidate's edits at the end, whatever that is.
-struct DiscardAtEnd {
-    Configuration &configuration;
-    ~DiscardAtEnd() { configuration.discard(); }
-};
 
 } // namespace
 
@@ -173,7 +148,7 @@ json Requests::load(const json &request, const ClientInfo &)
     if (!result.faults.empty()) {
         throw_bad_lines(source, result.faults);
     }
-    log_host_line(ov_log_info, "mgmtd", "loaded " + source);
+    log_line(ov_log_info, "loaded " + source);
     return {{"set", result.set}, {"removed", result.removed}};
 }
 
@@ -202,21 +177,14 @@ json Requests::check(const json &, const ClientInfo &)
     return {{"changes", report.changes.size()}, {"warnings", warnings_json(report.warnings)}};
 }
 
-/// Commits the candidate; anything but an accepted commit is thrown.
-CommitReport Requests::store_candidate(const CommitNote &note, const char *refusal)
-{
-    daemon_.before_events();
-    CommitReport report = configuration_.commit(note);
-    daemon_.wait_changed();
-    throw_unless_accepted(report, refusal);
-    return report;
-}
-
 json Requests::commit(const json &request, const ClientInfo &client)
 {
+    const CommitNote note = client_note(request, client);
     const std::optional<Wait> waited = configuration_.store().wait();
-    const CommitReport report =
-        store_candidate(client_note(request, client), "the commit is refused");
+    daemon_.before_events();
+    const CommitReport report = configuration_.commit(note);
+    daemon_.after_commit();
+    throw_unless_accepted(report, "the commit is refused");
     return commit_answer(configuration_, report, waited);
 }
 
@@ -229,14 +197,14 @@ json Requests::rollback(const json &request, const ClientInfo &client)
 {
     daemon_.before_events();
     json answer = answer_rollback(configuration_, request, client);
-    daemon_.wait_changed();
+    daemon_.after_commit();
     return answer;
 }
 
 json Requests::confirm(const json &, const ClientInfo &)
 {
     json answer = answer_confirm(configuration_);
-    daemon_.wait_changed();
+    daemon_.after_commit();
     return answer;
 }
 
@@ -257,39 +225,9 @@ json Requests::alarm(const json &request, const ClientInfo &)
 
 json Requests::upgrade(const json &request, const ClientInfo &client)
 {
-    const std::string text = required_text(request, "text");
-    const std::string source = optional_text(request, "source", "text");
-    Candidate &candidate = configuration_.candidate();
-    // They would be stored with the upgrade, or be lost with it.
-    if (!candidate.pending(configuration_.running()).empty()) {
-        throw RequestError(error_code::refused,
-                           "the candidate has edits: commit or discard them first");
-    }
-    const DiscardAtEnd restore{configuration_};
-    configuration_.discard();
-    const LegacyUpgrade result = upgrade_legacy(candidate, text);
-    if (!result.line_faults.empty()) {
-        throw_bad_lines(source, result.line_faults);
-    }
-    if (!result.entry_faults.empty()) {
-        throw RequestError(error_code::refused, "entries cannot be upgraded; nothing was stored",
-                           details_of(result.entry_faults));
-    }
-    if (result.converted + result.by_acl == 0) {
-        throw RequestError(error_code::refused,
-                           "there are no map entries to convert; nothing was stored (use load for "
-                           "a file of other nodes)");
-    }
-    CommitNote note = client_note(request, client);
-    if (note.comment.empty()) {
-        note.comment = "upgrade from " + source;
-    }
-    const std::optional<Wait> waited = configuration_.store().wait();
-    const CommitReport report = store_candidate(note, "the upgraded configuration is refused");
-    json answer = commit_answer(configuration_, report, waited);
-    answer["changes"] = changes_json(report.changes);
-    answer["converted"] = result.converted;
-    answer["by_acl"] = result.by_acl;
+    daemon_.before_events();
+    json answer = answer_upgrade(configuration_, request, client);
+    daemon_.after_commit();
     return answer;
 }
 

@@ -1,7 +1,7 @@
 #pragma once
 // What clients can ask of the daemon: one handler for each command of docs/control-protocol.md.
 // control/server.h brings the requests; configuration.h is what they are about. history_requests.h,
-// library_requests.h and show.h have the answers of their own fields.
+// library_requests.h, upgrade_requests.h and show.h have the answers of their own fields.
 
 #include "host/control/request_handler.h"
 #include "host/mgmtd/configuration.h"
@@ -15,15 +15,16 @@
 namespace ovhost
 {
 
-struct PeerStatus;
+struct PeerStatus; // control/server.h
 
 /// What the handlers need to know of the daemon around them.
 struct DaemonView {
     std::function<std::vector<PeerStatus>()> peers;
     /// Called before anything that may send events.
     std::function<void()> before_events;
-    /// Called when a commit may have begun to wait for its confirmation, or need not any more.
-    std::function<void()> wait_changed = [] {};
+    /// Called when a commit may have been stored, or one need not wait for its confirmation any
+    /// more: the time of undoing may be another, and those who watch have to be told.
+    std::function<void()> after_commit = [] {};
 };
 
 class Requests : public RequestHandler
@@ -55,8 +56,6 @@ class Requests : public RequestHandler
     nlohmann::json enable(const nlohmann::json &request, const ClientInfo &client);
     nlohmann::json clear(const nlohmann::json &request, const ClientInfo &client);
     nlohmann::json alarm(const nlohmann::json &request, const ClientInfo &client);
-
-    CommitReport store_candidate(const CommitNote &note, const char *refusal);
 
     Configuration &configuration_;
     DaemonView daemon_;

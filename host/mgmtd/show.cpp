@@ -3,6 +3,7 @@
 #include "framework/appliance.h"
 #include "host/control/arguments.h"
 #include "host/control/request_error.h"
+#include "host/mgmtd/answers.h"
 #include "host/mgmtd/configuration.h"
 #include "host/mgmtd/history_requests.h"
 #include "host/mgmtd/show_interfaces.h"
@@ -24,12 +25,6 @@ namespace
 {
 
 using nlohmann::json;
-
-template <typename Fact>
-json or_null(const std::optional<Fact> &fact)
-{
-    return fact ? json(*fact) : json();
-}
 
 json show_mode(Configuration &configuration, const json &)
 {

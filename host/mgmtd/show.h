@@ -1,6 +1,7 @@
 #pragma once
 // The answers to the command "show": what the running configuration amounts to. requests.h has all
-// other commands, show_maps.h the answers about maps and ACLs.
+// other commands; show_maps.h, show_interfaces.h and history_requests.h have the answers about maps
+// and ACLs, interfaces and single commits.
 
 #include <nlohmann/json_fwd.hpp>
 

@@ -1,5 +1,6 @@
 #include "host/mgmtd/show_interfaces.h"
 
+#include "host/mgmtd/answers.h"
 #include "host/mgmtd/configuration.h"
 #include "host/modules/interface_budget.h"
 #include "host/modules/interface_lookup.h"
@@ -24,7 +25,7 @@ json show_interfaces(Configuration &configuration, const json &)
                               {"kind", facts.is_vlan     ? "vlan"
                                        : facts.is_tunnel ? "tunnel"
                                                          : "interface"},
-                              {"enabled", facts.is_enabled ? json(*facts.is_enabled) : json()},
+                              {"enabled", or_null(facts.is_enabled)},
                               {"users", std::move(users)}});
     }
     return {{"interfaces", std::move(interfaces)}};

@@ -2,6 +2,7 @@
 
 #include "host/control/arguments.h"
 #include "host/control/request_error.h"
+#include "host/mgmtd/answers.h"
 #include "host/mgmtd/configuration.h"
 #include "host/modules/map_lookup.h"
 
@@ -13,11 +14,6 @@ namespace
 {
 
 using nlohmann::json;
-
-json or_null(const std::optional<std::string> &text)
-{
-    return text ? json(*text) : json();
-}
 
 json entry_json(const MapEntry &entry)
 {

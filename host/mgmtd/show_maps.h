@@ -9,6 +9,7 @@ namespace ovhost
 
 class Configuration;
 
+/// All maps, kind by kind, with what their entries match.
 [[nodiscard]] nlohmann::json show_maps(Configuration &configuration, const nlohmann::json &request);
 
 /// Throws RequestError for an ACL that is not there.
