@@ -1,8 +1,10 @@
 #pragma once
 // What is inside the host objects that framework/ hands to the library as opaque pointers.
 //
-// Only the framework's own sources and the commit engine look in here; everything else goes
-// through the operations.
+// The framework's own sources look in here, and whoever makes or implements an object: the commit
+// engine its databases, changes and commits; a module a database beside the commit's, or a commit
+// that takes the words of a refusal; the daemon its databases and the session of a peer. Whoever
+// is handed an object goes through the operations.
 
 #include "framework/bnode.h"
 #include "framework/md_commit.h"
