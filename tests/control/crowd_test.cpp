@@ -7,9 +7,9 @@
 
 #include <gtest/gtest.h>
 
-#include <algorithm>
 #include <atomic>
 #include <chrono>
+#include <future>
 #include <latch>
 #include <memory>
 #include <string>
@@ -23,46 +23,37 @@ namespace
 
 using nlohmann::json;
 using std::chrono::milliseconds;
-using std::chrono::steady_clock;
 using test::RawClient;
 using test::TestServer;
 
 constexpr int clients = 100;
 constexpr int requests_each = 50;
 
-/// What one client of the crowd has seen.
-struct Record {
-    int right = 0;
-    steady_clock::duration longest_wait{};
-};
-
-void ask_on_and_on(const std::string &path, int number, std::latch &all_connected, Record &record)
+/// How many of one client's answers are its own.
+int ask_on_and_on(const std::string &path, int number, std::latch &all_connected)
 {
     ControlClient client(path, std::chrono::seconds(60));
     all_connected.arrive_and_wait();
+    int right = 0;
     for (int i = 0; i < requests_each; ++i) {
         const std::string text = std::to_string(number) + "/" + std::to_string(i);
-        const auto began = steady_clock::now();
         const json result = client.call("echo", {{"text", text}});
-        record.longest_wait = std::max(record.longest_wait, steady_clock::now() - began);
-        record.right += result.at("text") == text ? 1 : 0;
+        right += result.at("text") == text ? 1 : 0;
     }
+    return right;
 }
 
 TEST(CrowdTest, AHundredClientsAskAtOnceAndEachGetsItsOwnAnswers)
 {
     TestServer server;
     std::latch all_connected(clients);
-    std::vector<Record> records(clients);
-    std::vector<std::jthread> threads;
-    for (int i = 0; i < clients; ++i)
-        threads.emplace_back([&, i] {
-            ask_on_and_on(server.path(), i, all_connected, records[static_cast<std::size_t>(i)]);
-        });
-    threads.clear();
-    for (const Record &record : records) {
-        EXPECT_EQ(record.right, requests_each);
-        EXPECT_LT(record.longest_wait, std::chrono::seconds(5));
+    std::vector<std::future<int>> right;
+    for (int i = 0; i < clients; ++i) {
+        right.push_back(std::async(
+            std::launch::async, [&, i] { return ask_on_and_on(server.path(), i, all_connected); }));
+    }
+    for (std::future<int> &answers : right) {
+        EXPECT_EQ(answers.get(), requests_each);
     }
 }
 
@@ -141,11 +132,11 @@ TEST(CrowdTest, UnfinishedRequestsTogetherHaveABound)
 
 TEST(CrowdTest, ClientsThatLeaveUnfinishedRequestsBehindAreForgotten)
 {
-    TestServer server({}, {.max_unserved = 3000000});
+    TestServer server({}, {.max_unserved = 300000});
     const std::string head = R"({"id":1,"command":"echo","text":")";
     for (int i = 0; i < 20; ++i) {
         RawClient client(server.path());
-        ASSERT_TRUE(client.send(head + std::string(1000000, 'x')));
+        ASSERT_TRUE(client.send(head + std::string(100000, 'x')));
         client.shut_down_writing();
         ASSERT_NE(client.line().find("bad-json"), std::string::npos);
         ASSERT_EQ(client.line(), "<end>");

@@ -10,6 +10,7 @@
 #include <algorithm>
 #include <atomic>
 #include <chrono>
+#include <latch>
 #include <string>
 #include <thread>
 
@@ -175,13 +176,13 @@ TEST(HostileClientTest, AClientThatReadsSlowlyButReadsIsNotDisconnected)
         [&](const json &, const ClientInfo &) -> json {
             return {{"text", large}};
         },
-        {.stall_timeout = std::chrono::milliseconds(1000)});
+        {.stall_timeout = std::chrono::milliseconds(600)});
     RawClient slow(server.path());
     slow.send("{\"id\":1,\"command\":\"get\"}\n");
-    // Some twenty pauses of 100 ms: twice as long as a client may stand still.
+    // Some fifteen pauses: together longer than a client may stand still, each a tenth of it.
     for (std::size_t total = 0; total < large.size();) {
-        std::this_thread::sleep_for(std::chrono::milliseconds(100));
-        const std::size_t got = slow.skip(std::min<std::size_t>(200000, large.size() - total));
+        std::this_thread::sleep_for(std::chrono::milliseconds(60));
+        const std::size_t got = slow.skip(std::min<std::size_t>(280000, large.size() - total));
         ASSERT_GT(got, 0U) << "disconnected after " << total << " bytes";
         total += got;
     }
@@ -191,22 +192,25 @@ TEST(HostileClientTest, AClientThatReadsSlowlyButReadsIsNotDisconnected)
 TEST(HostileClientTest, TheTimeARequestTakesIsNotHeldAgainstItsClient)
 {
     const std::string large(4UL << 20, 'y');
+    std::latch handled(1);
     TestServer server(
         [&](const json &, const ClientInfo &) -> json {
-            std::this_thread::sleep_for(std::chrono::milliseconds(1200));
+            std::this_thread::sleep_for(std::chrono::milliseconds(1100));
+            handled.count_down();
             return {{"text", large}};
         },
         {.stall_timeout = std::chrono::milliseconds(1000)});
     RawClient client(server.path());
     client.send("{\"id\":1,\"command\":\"get\"}\n");
-    // Starts to read well after the answer began, well before its patience ends.
-    std::this_thread::sleep_for(std::chrono::milliseconds(1500));
+    // Starts to read when the answer began, well before its patience ends.
+    handled.wait();
+    std::this_thread::sleep_for(std::chrono::milliseconds(100));
     EXPECT_EQ(client.line(), R"({"id":1,"ok":true,"result":{"text":")" + large + "\"}}");
 }
 
 TEST(HostileClientTest, AClientThatLeavesWithoutReadingDoesNoHarm)
 {
-    const std::string large(4UL << 20, 'y');
+    const std::string large(1UL << 20, 'y');
     TestServer server([&](const json &, const ClientInfo &) -> json { return {{"text", large}}; });
     for (int i = 0; i < 20; ++i) {
         RawClient client(server.path());
@@ -234,18 +238,18 @@ TEST(HostileClientTest, ARequestThatIsNotEndedEndsTheConnectionHoweverOftenAPiec
 
 TEST(HostileClientTest, AClientThatBeginsNoRequestIsNotDisconnected)
 {
-    TestServer server({}, {.stall_timeout = std::chrono::milliseconds(100)});
+    TestServer server({}, {.stall_timeout = std::chrono::milliseconds(1000)});
     RawClient quiet(server.path());
     expect_served(quiet);
     // Each request is begun and ended in time, and all of them take longer than one may.
+    RawClient slow(server.path());
     const std::string request(echo_request);
-    for (int i = 0; i < 10; ++i) {
-        ASSERT_TRUE(quiet.send(request.substr(0, 10)));
-        std::this_thread::sleep_for(std::chrono::milliseconds(20));
-        ASSERT_TRUE(quiet.send(request.substr(10)));
-        EXPECT_EQ(quiet.line(), echo_answer);
+    for (int i = 0; i < 6; ++i) {
+        ASSERT_TRUE(slow.send(request.substr(0, 10)));
+        std::this_thread::sleep_for(std::chrono::milliseconds(200));
+        ASSERT_TRUE(slow.send(request.substr(10)));
+        EXPECT_EQ(slow.line(), echo_answer);
     }
-    std::this_thread::sleep_for(std::chrono::milliseconds(300));
     expect_served(quiet);
     EXPECT_TRUE(server.logged("disconnected").empty());
 }
@@ -253,19 +257,23 @@ TEST(HostileClientTest, AClientThatBeginsNoRequestIsNotDisconnected)
 TEST(HostileClientTest, ARequestThatIsEndedWhileTheServerIsBusyIsServed)
 {
     const std::string text(1UL << 20, 'x');
+    std::latch at_work(1);
     TestServer server(
         [&](const json &request, const ClientInfo &) -> json {
-            if (request.at("command") == "wait")
-                std::this_thread::sleep_for(std::chrono::milliseconds(600));
+            if (request.at("command") == "wait") {
+                at_work.count_down();
+                std::this_thread::sleep_for(std::chrono::milliseconds(1100));
+            }
             return {{"length", request.value("text", "").size()}};
         },
-        {.stall_timeout = std::chrono::milliseconds(300)});
+        {.stall_timeout = std::chrono::milliseconds(1000)});
     RawClient busy(server.path());
     RawClient client(server.path());
-    ASSERT_TRUE(client.send("{\"id\":1,\"command\":\"get\","));
-    ASSERT_TRUE(eventually([&] { return server.client_count() == 2; }));
-    std::this_thread::sleep_for(std::chrono::milliseconds(50));
+    // The answer tells that the begun request has arrived as well.
+    ASSERT_TRUE(client.send("{\"id\":0,\"command\":\"get\"}\n{\"id\":1,\"command\":\"get\","));
+    ASSERT_EQ(client.line(), R"({"id":0,"ok":true,"result":{"length":0}})");
     ASSERT_TRUE(busy.send("{\"command\":\"wait\"}\n"));
+    at_work.wait();
     ASSERT_TRUE(client.send("\"text\":\"" + text + "\"}\n"));
     EXPECT_EQ(client.line(), R"({"id":1,"ok":true,"result":{"length":1048576}})");
 }

@@ -137,8 +137,7 @@ TEST_F(OvctlWatchTest, CanBeInterruptedWhileItsReaderDoesNotRead)
     ASSERT_TRUE(wait_for_watcher());
     for (int i = 0; i < 500; ++i)
         report(commit_event(i, one_change()));
-    // The terminal holds less than that.
-    std::this_thread::sleep_for(std::chrono::milliseconds(300));
+    ASSERT_TRUE(watch.fill_up()) << "the terminal holds less than that";
     watch.signal(SIGINT);
     int exit = -1;
     ASSERT_TRUE(watch.wait_unread(exit)) << "it is stuck";

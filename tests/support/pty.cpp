@@ -4,6 +4,7 @@
 
 #include <poll.h>
 #include <pty.h>
+#include <sys/ioctl.h>
 #include <sys/wait.h>
 #include <unistd.h>
 
@@ -16,7 +17,6 @@
 
 namespace ovtest
 {
-
 namespace
 {
 
@@ -109,6 +109,22 @@ int PtyProcess::read_to_end()
     ::waitpid(pid_, &status, 0);
     pid_ = -1;
     return exit_code_of(status);
+}
+
+bool PtyProcess::fill_up() const
+{
+    using Clock = std::chrono::steady_clock;
+    int before = 0;
+    auto since = Clock::now();
+    return eventually([&] {
+        int waiting = 0;
+        ::ioctl(master_, FIONREAD, &waiting);
+        if (waiting != before) {
+            before = waiting;
+            since = Clock::now();
+        }
+        return waiting > 0 && Clock::now() - since > std::chrono::milliseconds(100);
+    });
 }
 
 bool PtyProcess::wait_unread(int &exit_code)

@@ -32,6 +32,10 @@ class PtyProcess
     /// Reads to the end, and waits for it: the exit code, or 128 and the number of the signal.
     [[nodiscard]] int read_to_end();
 
+    /// Waits without reading until no more is printed, since the terminal holds no more; false when
+    /// nothing is printed at all.
+    [[nodiscard]] bool fill_up() const;
+
     /// Waits for the end without reading; false when it does not come within ten seconds.
     [[nodiscard]] bool wait_unread(int &exit_code);
 
