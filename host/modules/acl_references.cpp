@@ -30,8 +30,7 @@ std::string delete_record(const std::string &acl, const MapEntry &entry)
 /// What mends a record that is missing, or is not what it should be: the ACL named once more.
 std::string name_again(const MapEntry &entry)
 {
-    return "; delete " + match_node(*entry.kind, entry.map, entry.priority, "acl") +
-           ", commit, and set it again";
+    return "; delete " + match_node(entry, "acl") + ", commit, and set it again";
 }
 
 /// A record that does not fit the maps.
@@ -61,28 +60,14 @@ void check_entry(const mdb_db *db, const MapEntry &entry, std::vector<ReferenceF
         {acl, entry, "the entry names the ACL, but there is no " + missing + name_again(entry)});
 }
 
-void check_maps(const mdb_db *db, const MapKind &kind, std::vector<ReferenceFault> &faults)
-{
-    for (const std::string &map : child_names(db, kind.root)) {
-        for (const std::string &priority : child_names(db, map_node(kind, map) + "/prio")) {
-            check_entry(db, {&kind, map, priority}, faults);
-        }
-    }
-}
-
 } // namespace
-
-std::string describe(const MapEntry &entry)
-{
-    return std::string(entry.kind->name) + " " + entry.map + ", entry " + entry.priority;
-}
 
 std::string acl_of(const mdb_db *db, const MapEntry &entry)
 {
     if (entry.priority == default_priority) {
         return {};
     }
-    return node_text(db, match_node(*entry.kind, entry.map, entry.priority, "acl")).value_or("");
+    return node_text(db, match_node(entry, "acl")).value_or("");
 }
 
 std::string reference_node(const std::string &acl, const MapEntry &entry)
@@ -126,7 +111,9 @@ ReferenceCheck check_references(const mdb_db *db)
         }
     }
     for (const MapKind &kind : map_kinds) {
-        check_maps(db, kind, check.faults);
+        for (const MapEntry &entry : entries_of(db, kind)) {
+            check_entry(db, entry, check.faults);
+        }
     }
     return check;
 }

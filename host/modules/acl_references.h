@@ -5,28 +5,15 @@
 //
 // acl_nodes.h has the nodes, acls.h the module that keeps users from writing records.
 
-#include "host/modules/map_kinds.h"
-
 #include "framework/md_commit.h"
 #include "framework/mdb_db.h"
+#include "host/modules/map_entries.h"
 
 #include <string>
 #include <vector>
 
 namespace ovhost
 {
-
-/// An entry of a map.
-struct MapEntry {
-    const MapKind *kind = nullptr;
-    std::string map;
-    std::string priority;
-
-    bool operator==(const MapEntry &) const = default;
-};
-
-/// "route-map m1, entry 10"
-[[nodiscard]] std::string describe(const MapEntry &entry);
 
 /// The ACL that the entry refers to; empty when there is none. The default entry of a map refers to
 /// none, whatever it names.

@@ -24,11 +24,6 @@ constexpr std::size_t number_part = acl_name_part + 2;
 constexpr std::size_t field_part = acl_name_part + 3;
 constexpr std::size_t reference_size = acl_name_part + 5;
 
-bool is_deleted(const mdb_db_change *change)
-{
-    return change->mdc_change_type == mdct_delete;
-}
-
 // The ACL itself.
 
 /// Whether there is something of the user's below the ACL.
@@ -101,8 +96,8 @@ int check_entry(md_dbinfo *dbinfo, const mdb_db_change *change, const Parts &par
     const std::string node = acl_entry_node(acl, number);
     const bool is_entry = parts.size() == field_part;
     if (is_deleted(change)) {
-        if (is_entry && !child_names(dbinfo->newdb, node).empty()) {
-            propose(dbinfo, node, bt_uint16, number);
+        if (is_entry) {
+            (void)bring_back_replaced(dbinfo, node, bt_uint16, number);
         }
         return 0;
     }

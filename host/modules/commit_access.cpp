@@ -29,6 +29,11 @@ bool matches(const mdb_db_change *change, const std::string &pattern)
     return bn_binding_name_parts_pattern_match(change->mdc_name_parts, true, pattern.c_str());
 }
 
+bool is_deleted(const mdb_db_change *change)
+{
+    return change->mdc_change_type == mdct_delete;
+}
+
 std::optional<std::string> new_text(const mdb_db_change *change)
 {
     const TstringPtr text = attribute_text(change->mdc_new_attribs);
@@ -68,6 +73,16 @@ void propose(const md_dbinfo *dbinfo, const std::string &node, bn_type type,
 void propose_removal(const md_dbinfo *dbinfo, const std::string &node)
 {
     write(dbinfo, bsso_delete, bt_none, nullptr, node);
+}
+
+bool bring_back_replaced(const md_dbinfo *dbinfo, const std::string &node, bn_type type,
+                         const std::string &text)
+{
+    if (child_names(dbinfo->newdb, node).empty()) {
+        return false;
+    }
+    propose(dbinfo, node, type, text);
+    return true;
 }
 
 void propose_missing(const md_dbinfo *dbinfo, const std::string &node, bn_type type,

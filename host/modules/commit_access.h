@@ -16,6 +16,8 @@ namespace ovhost
 
 [[nodiscard]] bool matches(const mdb_db_change *change, const std::string &pattern);
 
+[[nodiscard]] bool is_deleted(const mdb_db_change *change);
+
 /// The changed node's new value as text; nothing for a deleted node.
 [[nodiscard]] std::optional<std::string> new_text(const mdb_db_change *change);
 
@@ -37,6 +39,11 @@ void propose(const md_dbinfo *dbinfo, const std::string &node, bn_type type,
 /// Removes a node and all below it from the database that the commit proposes. Throws
 /// std::runtime_error.
 void propose_removal(const md_dbinfo *dbinfo, const std::string &node);
+
+/// Brings back a deleted node when there is something below it again: it was replaced, and not
+/// deleted. Whether it did.
+[[nodiscard]] bool bring_back_replaced(const md_dbinfo *dbinfo, const std::string &node,
+                                       bn_type type, const std::string &text);
 
 /// Writes the node when it holds no value in the proposed database.
 void propose_missing(const md_dbinfo *dbinfo, const std::string &node, bn_type type,

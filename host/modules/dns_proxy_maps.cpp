@@ -40,8 +40,9 @@ std::string node_of(const Parts &parts, std::size_t last_part)
 /// What is wrong with a node that is added or modified.
 std::optional<std::string> node_fault(const Parts &parts, const mdb_db_change *change)
 {
-    if (parts[vrf_part] != "0") {
-        return "DNS-proxy maps are those of VRF 0, not \"" + parts[vrf_part] + "\"";
+    if (parts[vrf_part] != dns_proxy_vrf) {
+        return "DNS-proxy maps are those of VRF " + std::string(dns_proxy_vrf) + ", not \"" +
+               parts[vrf_part] + "\"";
     }
     if (auto fault = plain_name_fault("a map's name", parts[map_part])) {
         return fault;
@@ -71,16 +72,20 @@ void complete(const md_dbinfo *dbinfo, const Parts &parts)
 
 } // namespace
 
+std::string dns_proxy_maps_node(const std::string &vrf)
+{
+    return "/ov/dnsproxy/config/" + vrf + "/map";
+}
+
 std::vector<std::string> DnsProxyMapsModule::patterns() const
 {
-    return patterns_below(dns_proxy_pattern, levels_of_a_map);
+    return patterns_below(dns_proxy_maps_node("*"), levels_of_a_map);
 }
 
 int DnsProxyMapsModule::check_change(md_dbinfo *dbinfo, mdb_db_change *change)
 {
     const Parts parts = name_parts(change);
-    const bool is_deleted = change->mdc_change_type == mdct_delete;
-    if (!is_deleted) {
+    if (!is_deleted(change)) {
         if (const auto fault = node_fault(parts, change)) {
             return refuse(dbinfo, *fault);
         }
@@ -91,7 +96,7 @@ int DnsProxyMapsModule::check_change(md_dbinfo *dbinfo, mdb_db_change *change)
         err != 0 || refused) {
         return err;
     }
-    if (!is_deleted) {
+    if (!is_deleted(change)) {
         complete(dbinfo, parts);
     }
     return 0;

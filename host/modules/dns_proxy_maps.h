@@ -9,11 +9,17 @@
 
 #include "host/commit/module.h"
 
+#include <string>
+#include <vector>
+
 namespace ovhost
 {
 
-/// The maps are children of the nodes that match.
-inline constexpr const char *dns_proxy_pattern = "/ov/dnsproxy/config/*/map";
+/// Those of a VRF are the node's children; "*" makes a pattern of it for those of every VRF.
+[[nodiscard]] std::string dns_proxy_maps_node(const std::string &vrf);
+
+/// The VRF that the library counts.
+inline constexpr const char *dns_proxy_vrf = "0";
 
 class DnsProxyMapsModule : public Module
 {

@@ -88,7 +88,7 @@ std::vector<Subnet> lost_subnets(const md_dbinfo *dbinfo, const mdb_db_change_ar
 
 void log_removal(const Subnet &subnet, std::size_t next_hops)
 {
-    log_host_line(ov_log_notice, "interfaces",
+    log_host_line(ov_log_notice, "interface-address",
                   "the address " + subnet.address + "/" + std::to_string(subnet.mask_length) +
                       " is gone, and " + std::to_string(next_hops) +
                       (next_hops == 1 ? " next hop" : " next hops") + " behind it");

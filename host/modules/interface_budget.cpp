@@ -16,6 +16,9 @@ namespace
 /// The last number of kernel interfaces that is not too many.
 constexpr uint32 most_in_kernel = MD_IFMGR_IFINDEX_BUDGET - 1;
 
+/// VLAN and tunnel interfaces alike.
+const std::string counted_pattern = tunneld_interfaces_node("*") + "/*";
+
 struct Tally {
     int added = 0;
     int removed = 0;
@@ -28,11 +31,11 @@ Tally count_interfaces(const mdb_db_change_array *changes)
     for (int32 i = 0; i < count; ++i) {
         const mdb_db_change *const change =
             mdb_db_change_array_get_quick(changes, static_cast<uint32>(i));
-        if (change == nullptr || !matches(change, tunneld_interface_pattern)) {
+        if (change == nullptr || !matches(change, counted_pattern)) {
             continue;
         }
         tally.added += change->mdc_change_type == mdct_add;
-        tally.removed += change->mdc_change_type == mdct_delete;
+        tally.removed += is_deleted(change);
     }
     return tally;
 }
@@ -43,8 +46,7 @@ int count_configured(const mdb_db *db)
     const auto has_value = [db](const std::string &node) {
         return node_text(db, node).has_value();
     };
-    return static_cast<int>(
-        std::ranges::count_if(matching_nodes(db, tunneld_interface_pattern), has_value));
+    return static_cast<int>(std::ranges::count_if(matching_nodes(db, counted_pattern), has_value));
 }
 
 uint32 not_negative(int number)
@@ -90,7 +92,7 @@ InterfaceBudget measure_interface_budget()
 
 std::vector<std::string> InterfaceBudgetModule::patterns() const
 {
-    return {tunneld_interface_pattern};
+    return {counted_pattern};
 }
 
 void InterfaceBudgetModule::start(const mdb_db *running)
@@ -108,7 +110,7 @@ int InterfaceBudgetModule::check_commit(md_dbinfo *dbinfo, const mdb_db_change_a
 {
     // The library takes the list without const, and only reads it.
     auto *const list = const_cast<mdb_db_change_array *>(changes);
-    return md_ifmgr_can_interface_be_added(list, tunneld_interface_pattern, kernel_interfaces_each)
+    return md_ifmgr_can_interface_be_added(list, counted_pattern.c_str(), kernel_interfaces_each)
                ? 0
                : refuse(dbinfo, refusal(count_interfaces(changes)));
 }

@@ -36,7 +36,7 @@ std::vector<InterfaceFacts> list_interfaces(const mdb_db *db)
     for (const std::string &name : vlan_names(db)) {
         found[name].is_vlan = true;
     }
-    for (const std::string &name : child_names(db, tunnel_interfaces_node)) {
+    for (const std::string &name : child_names(db, tunneld_interfaces_node(tunnel_kind))) {
         found[name].is_tunnel = true;
     }
     std::vector<InterfaceFacts> interfaces;

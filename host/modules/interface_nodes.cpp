@@ -26,13 +26,17 @@ bool is_bad(char character)
 
 std::string interface_record(const std::string &name)
 {
-    return join_name(std::vector<std::string>{"net", "interface", "config", name});
+    return std::string(interface_records_node) + "/" + escape_component(name);
+}
+
+std::string tunneld_interfaces_node(const std::string &kind)
+{
+    return "/ov/tunneld/net/interface/tunnel/" + kind + "/config";
 }
 
 std::string tunneld_interface(const std::string &kind, const std::string &name)
 {
-    return join_name(std::vector<std::string>{"ov", "tunneld", "net", "interface", "tunnel", kind,
-                                              "config", name});
+    return tunneld_interfaces_node(escape_component(kind)) + "/" + escape_component(name);
 }
 
 bool interface_exists(const mdb_db *db, const std::string &name)

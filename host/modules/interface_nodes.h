@@ -23,15 +23,12 @@ namespace ovhost
 
 inline constexpr const char *interface_records_node = "/net/interface/config";
 
-inline constexpr const char *tunnel_interfaces_node = "/ov/tunneld/net/interface/tunnel/ip/config";
-
-/// The interfaces that tunneld makes, of whatever kind.
-inline constexpr const char *tunneld_interface_pattern =
-    "/ov/tunneld/net/interface/tunnel/*/config/*";
-
-/// The kinds of them.
+/// The kinds of interfaces that tunneld makes.
 inline constexpr const char *vlan_kind = "vlan";
 inline constexpr const char *tunnel_kind = "ip";
+
+/// Those of a kind are the node's children; "*" makes a pattern of it for those of every kind.
+[[nodiscard]] std::string tunneld_interfaces_node(const std::string &kind);
 
 /// The full names of nodes, names escaped.
 [[nodiscard]] std::string interface_record(const std::string &name);

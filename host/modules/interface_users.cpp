@@ -74,7 +74,7 @@ std::vector<std::string> InterfaceUsersModule::patterns() const
 
 int InterfaceUsersModule::check_change(md_dbinfo *dbinfo, mdb_db_change *change)
 {
-    if (change->mdc_change_type == mdct_delete) {
+    if (is_deleted(change)) {
         return 0;
     }
     const User &user = *std::ranges::find_if(

@@ -3,6 +3,7 @@
 #include "framework/appliance.h"
 #include "host/framework/match_string.h"
 #include "host/modules/commit_access.h"
+#include "host/modules/interface_nodes.h"
 #include "host/modules/match_strings.h"
 #include "host/modules/node_access.h"
 #include "host/modules/plain_names.h"
@@ -13,22 +14,16 @@ namespace ovhost
 namespace
 {
 
-// The library takes component 7 for the VLAN's name.
-constexpr const char *vlan_pattern = "/ov/tunneld/net/interface/tunnel/vlan/config/*";
 constexpr const char *label_pattern = "/ov/iflabels/config/*/*";
 constexpr const char *preferred_pattern =
     "/ov/tunneld/net/routes/config/ipv4/prefix/*/nhop/*/preferred_if";
-
-bool is_deleted(const mdb_db_change *change)
-{
-    return change->mdc_change_type == mdct_delete;
-}
 
 } // namespace
 
 std::vector<std::string> VlansModule::patterns() const
 {
-    return {vlan_pattern};
+    // The library takes component 7 for the VLAN's name.
+    return {tunneld_interfaces_node(vlan_kind) + "/*"};
 }
 
 int VlansModule::check_change(md_dbinfo *dbinfo, mdb_db_change *change)

@@ -3,6 +3,7 @@
 #include "framework/addresses.h"
 #include "framework/errors.h"
 #include "host/framework/objects.h"
+#include "host/modules/map_entries.h"
 #include "host/modules/node_access.h"
 #include "host/tree/name.h"
 #include "orvale/md_xmap_common.h"
@@ -182,11 +183,9 @@ std::string with_code(const std::string &fault, int err)
 std::vector<LegacyEntry> legacy_entries(const mdb_db &db, const MapKind &kind)
 {
     std::vector<LegacyEntry> entries;
-    for (const std::string &map : child_names(&db, kind.root)) {
-        for (const std::string &priority : child_names(&db, map_node(kind, map) + "/prio")) {
-            const std::string node = entry_node(kind, map, priority);
-            entries.push_back({node, node + "/" + kind.match});
-        }
+    for (const MapEntry &entry : entries_of(&db, kind)) {
+        const std::string node = entry_node(kind, entry.map, entry.priority);
+        entries.push_back({node, node + "/" + kind.match});
     }
     return entries;
 }

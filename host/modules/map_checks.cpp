@@ -146,16 +146,11 @@ bool bring_back(const MapKind &kind, const md_dbinfo *dbinfo, const mdb_db_chang
 {
     const bool is_set = changed.priority && !changed.rest.empty() &&
                         changed.rest.front() == "set" && changed.rest.size() == set_depth(kind);
-    if (change->mdc_change_type != mdct_delete ||
-        (!changed.is_map() && !changed.is_entry() && !is_set)) {
+    if (!is_deleted(change) || (!changed.is_map() && !changed.is_entry() && !is_set)) {
         return false;
     }
     const NodeValue node = own_node(kind, changed);
-    if (child_names(dbinfo->newdb, node.node).empty()) {
-        return false;
-    }
-    propose(dbinfo, node.node, node.type, node.text);
-    return true;
+    return bring_back_replaced(dbinfo, node.node, node.type, node.text);
 }
 
 } // namespace ovhost

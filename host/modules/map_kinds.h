@@ -1,7 +1,8 @@
 #pragma once
 // The kinds of policy maps as the daemon's own parts see them, one row each. What is checked of
-// them is the library's (orvale/md_xmap_common.h); maps.h has the module of a kind, map_lookup.h
-// the questions about all of them. DNS-proxy maps are not among them: dns_proxy_maps.h.
+// them is the library's (orvale/md_xmap_common.h); maps.h has the module of a kind,
+// map_entries.h their entries, map_lookup.h the questions about all of them. DNS-proxy maps are not
+// among them: dns_proxy_maps.h.
 //
 // A map and what it consists of, ROOT being that of its kind:
 //
@@ -74,9 +75,5 @@ inline constexpr const char *default_priority = "65535";
 /// An entry's node.
 [[nodiscard]] std::string entry_node(const MapKind &kind, const std::string &map,
                                      const std::string &priority);
-
-/// A node below what an entry matches, such as "acl".
-[[nodiscard]] std::string match_node(const MapKind &kind, const std::string &map,
-                                     const std::string &priority, const char *leaf);
 
 } // namespace ovhost

@@ -1,6 +1,7 @@
 #include "host/modules/map_lookup.h"
 
 #include "host/modules/acl_nodes.h"
+#include "host/modules/dns_proxy_maps.h"
 #include "host/modules/node_access.h"
 #include "host/tree/name.h"
 
@@ -9,24 +10,22 @@ namespace ovhost
 namespace
 {
 
-constexpr const char *dns_proxy_root = "/ov/dnsproxy/config/0/map";
-
 MapFacts facts_of(const mdb_db *db, const MapKind &kind, const std::string &map)
 {
     MapFacts facts{kind.name, map, {}};
-    for (const std::string &priority : child_names(db, map_node(kind, map) + "/prio")) {
-        facts.entries.push_back({priority, node_text(db, match_node(kind, map, priority, "acl")),
-                                 node_text(db, match_node(kind, map, priority, "matchstr"))});
+    for (const MapEntry &entry : entries_of(db, kind, map)) {
+        facts.entries.push_back({entry.priority, node_text(db, match_node(entry, "acl")),
+                                 node_text(db, match_node(entry, "matchstr"))});
     }
     return facts;
 }
 
 void add_dns_proxy_maps(const mdb_db *db, std::vector<MapFacts> &maps)
 {
-    for (const std::string &map : child_names(db, dns_proxy_root)) {
+    const std::string root = dns_proxy_maps_node(dns_proxy_vrf);
+    for (const std::string &map : child_names(db, root)) {
         MapFacts facts{"dns-proxy-map", map, {}};
-        const std::string entries =
-            std::string(dns_proxy_root) + "/" + escape_component(map) + "/prio";
+        const std::string entries = root + "/" + escape_component(map) + "/prio";
         for (const std::string &priority : child_names(db, entries)) {
             facts.entries.push_back({priority, std::nullopt, std::nullopt});
         }

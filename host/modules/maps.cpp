@@ -43,8 +43,7 @@ int MapsModule::check_change(md_dbinfo *dbinfo, mdb_db_change *change)
     if (!changed || bring_back(kind_, dbinfo, change, *changed)) {
         return 0;
     }
-    const bool is_deleted = change->mdc_change_type == mdct_delete;
-    if (!is_deleted) {
+    if (!is_deleted(change)) {
         if (const auto fault = map_fault(kind_, dbinfo, change, *changed)) {
             return refuse(dbinfo, *fault);
         }
@@ -54,7 +53,7 @@ int MapsModule::check_change(md_dbinfo *dbinfo, mdb_db_change *change)
         err != 0 || refused) {
         return err;
     }
-    if (!is_deleted && matches(change, match_pattern(kind_, "matchstr"))) {
+    if (!is_deleted(change) && matches(change, match_pattern(kind_, "matchstr"))) {
         const MatchStringVerdict verdict = check_match_string(dbinfo, change);
         if (verdict.code != 0 || verdict.refused) {
             return verdict.code;
@@ -63,7 +62,7 @@ int MapsModule::check_change(md_dbinfo *dbinfo, mdb_db_change *change)
     if (const int err = md_acl_ref_processing(change, dbinfo, kind_.type); err != 0) {
         return err;
     }
-    if (is_deleted) {
+    if (is_deleted(change)) {
         follow_lost_acl(kind_, dbinfo, change, *changed);
     } else {
         complete_map(kind_, dbinfo, *changed);

@@ -2,8 +2,8 @@
 
 #include "host/framework/match_string.h"
 #include "host/modules/acl_nodes.h"
-#include "host/modules/acl_references.h"
 #include "host/modules/commit_access.h"
+#include "host/modules/map_entries.h"
 #include "host/modules/node_access.h"
 #include "host/modules/refusal_capture.h"
 #include "orvale/md_xmap_common.h"
@@ -96,12 +96,9 @@ MatchStringVerdict check_match_string(md_dbinfo *dbinfo, const mdb_db_change *ch
 std::optional<MatchingEntry> entry_that_matches_vlan(const mdb_db *db, const std::string &name)
 {
     for (const MapKind &kind : map_kinds) {
-        for (const std::string &map : child_names(db, kind.root)) {
-            for (const std::string &priority : child_names(db, map_node(kind, map) + "/prio")) {
-                if (node_matches_vlan(db, match_node(kind, map, priority, "matchstr"), name)) {
-                    return MatchingEntry{"a " + std::string(kind.name),
-                                         describe(MapEntry{&kind, map, priority})};
-                }
+        for (const MapEntry &entry : entries_of(db, kind)) {
+            if (node_matches_vlan(db, match_node(entry, "matchstr"), name)) {
+                return MatchingEntry{"a " + std::string(kind.name), describe(entry)};
             }
         }
     }

@@ -21,11 +21,11 @@ struct DepthRule {
 std::vector<DepthRule> make_rules()
 {
     std::vector<DepthRule> rules;
-    const auto add = [&rules](const char *root, std::size_t levels) {
+    const auto add = [&rules](const std::string &root, std::size_t levels) {
         rules.push_back({NamePattern::parse(root).value(), levels});
     };
     add(acls_node, levels_of_an_acl);
-    add(dns_proxy_pattern, levels_of_a_map);
+    add(dns_proxy_maps_node("*"), levels_of_a_map);
     for (const MapKind &kind : map_kinds) {
         add(kind.root_pattern, levels_of_a_map);
     }
@@ -62,7 +62,7 @@ bool is_too_deep(const DepthRule &rule, const std::vector<std::string> &parts)
 int NameDepthModule::check_change(md_dbinfo *dbinfo, mdb_db_change *change)
 {
     const auto length = static_cast<std::size_t>(tstr_array_length_quick(change->mdc_name_parts));
-    if (change->mdc_change_type == mdct_delete || length <= always_allowed()) {
+    if (is_deleted(change) || length <= always_allowed()) {
         return 0;
     }
     const std::vector<std::string> parts = name_parts(change);

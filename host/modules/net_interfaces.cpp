@@ -66,9 +66,7 @@ std::string join(const std::vector<InterfaceUse> &uses, std::string InterfaceUse
 
 int check_deletion(md_dbinfo *dbinfo, const InterfaceChange &changed)
 {
-    if (!child_names(dbinfo->newdb, changed.node).empty()) {
-        // It was replaced, and not deleted.
-        propose(dbinfo, changed.node, bt_string, changed.name);
+    if (bring_back_replaced(dbinfo, changed.node, bt_string, changed.name)) {
         return 0;
     }
     const std::vector<InterfaceUse> uses = interface_uses(dbinfo->newdb, changed.name);
@@ -84,23 +82,21 @@ int check_deletion(md_dbinfo *dbinfo, const InterfaceChange &changed)
 std::vector<std::string> NetInterfacesModule::patterns() const
 {
     std::vector<std::string> patterns = patterns_below(interface_records_node, levels_of_a_record);
-    std::ranges::copy(
-        patterns_below("/ov/tunneld/net/interface/tunnel/*/config", levels_of_a_tunneld_interface),
-        std::back_inserter(patterns));
+    std::ranges::copy(patterns_below(tunneld_interfaces_node("*"), levels_of_a_tunneld_interface),
+                      std::back_inserter(patterns));
     return patterns;
 }
 
 int NetInterfacesModule::check_change(md_dbinfo *dbinfo, mdb_db_change *change)
 {
     const InterfaceChange changed = interface_change(change);
-    const bool is_deleted = change->mdc_change_type == mdct_delete;
     if (!changed.is_itself) {
-        if (!is_deleted) {
+        if (!is_deleted(change)) {
             propose_missing(dbinfo, changed.node, bt_string, changed.name);
         }
         return 0;
     }
-    if (is_deleted) {
+    if (is_deleted(change)) {
         return check_deletion(dbinfo, changed);
     }
     const std::optional<std::string> fault = fault_of(changed, change);

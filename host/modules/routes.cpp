@@ -137,7 +137,7 @@ std::vector<std::string> RoutesModule::patterns() const
 
 int RoutesModule::check_change(md_dbinfo *dbinfo, mdb_db_change *change)
 {
-    if (change->mdc_change_type == mdct_delete) {
+    if (is_deleted(change)) {
         return 0;
     }
     const std::vector<std::string> parts = name_parts(change);

@@ -1,7 +1,7 @@
 #include "host/modules/schema.h"
 
-#include "framework/md_commit.h"
 #include "host/modules/commit_access.h"
+#include "host/modules/interface_nodes.h"
 #include "host/modules/map_kinds.h"
 #include "host/modules/node_access.h"
 #include "host/tree/name.h"
@@ -41,8 +41,8 @@ const NodeRule fixed_rules[] = {
     {"/ov/tunneld/acl/config/*/entry/*/protocol", bt_string},
     {"/ov/tunneld/acl/config/*/entry/*/application", bt_string},
     {"/ov/tunneld/app/config/*/name", bt_string},
-    {"/ov/tunneld/net/interface/tunnel/vlan/config/*", bt_string},
-    {"/ov/tunneld/net/interface/tunnel/ip/config/*", bt_string},
+    {tunneld_interfaces_node(vlan_kind) + "/*", bt_string},
+    {tunneld_interfaces_node(tunnel_kind) + "/*", bt_string},
     {"/ov/tunneld/net/routes/config/ipv4/prefix/*", bt_ipv4prefix},
     {"/ov/tunneld/net/routes/config/ipv4/prefix/*/nhop/*", bt_ipv4addr},
     {"/ov/tunneld/net/routes/config/ipv4/prefix/*/nhop/*/preferred_if", bt_string},
@@ -143,7 +143,7 @@ std::vector<std::string> SchemaModule::patterns() const
 int SchemaModule::check_change(md_dbinfo *dbinfo, mdb_db_change *change)
 {
     const NodeRule *const rule = rule_of(change);
-    if (rule == nullptr || change->mdc_change_type == mdct_delete) {
+    if (rule == nullptr || is_deleted(change)) {
         return 0;
     }
     BindingPtr binding = node_binding(dbinfo->newdb, ts_str(change->mdc_name));
@@ -151,12 +151,10 @@ int SchemaModule::check_change(md_dbinfo *dbinfo, mdb_db_change *change)
     const int err = bn_binding_get_str(binding.get(), ba_value, rule->type, 0, &text);
     const TextPtr owned_text(text);
     if (err == lc_err_bad_type) {
-        return md_commit_set_return_status_msg_fmt(dbinfo->commit, 1, "must be of type %s",
-                                                   type_name(rule->type).c_str());
+        return refuse(dbinfo, "must be of type " + type_name(rule->type));
     }
     if (err == 0 && !is_choice(*rule, text)) {
-        return md_commit_set_return_status_msg_fmt(dbinfo->commit, 1, "must be %s, not \"%s\"",
-                                                   choices(*rule).c_str(), text);
+        return refuse(dbinfo, "must be " + choices(*rule) + ", not \"" + text + "\"");
     }
     return err;
 }

@@ -1,6 +1,7 @@
 #include "host/modules/tunnel_checks.h"
 
 #include "framework/appliance.h"
+#include "host/modules/commit_access.h"
 #include "host/modules/model.h"
 #include "host/modules/node_access.h"
 #include "host/modules/tunnel_nodes.h"
@@ -110,7 +111,7 @@ Fault field_fault(const md_dbinfo *dbinfo, const std::string &name, const std::s
     return std::nullopt;
 }
 
-Fault name_fault(const mdb_db *newdb, const std::string &name)
+Fault name_fault(const mdb_db_change *change, const std::string &name)
 {
     if (name.size() >= TUNNEL_NAME_SIZE) {
         return "a tunnel's name is 1 to " + std::to_string(TUNNEL_NAME_SIZE - 1) +
@@ -119,9 +120,7 @@ Fault name_fault(const mdb_db *newdb, const std::string &name)
     if (name == TUNNEL_NAME_DEFAULT) {
         return quoted(name) + " is reserved and never holds an ID: choose another name";
     }
-    return node_text(newdb, tunnel_node(name)) == name
-               ? std::nullopt
-               : Fault("must hold the tunnel's name, " + quoted(name));
+    return own_name_fault("the tunnel's name", name, change);
 }
 
 /// A deleted tunnel must take its fields along.
@@ -151,18 +150,16 @@ Fault limit_fault(const mdb_db *newdb)
 
 Fault tunnel_fault(const md_dbinfo *dbinfo, const mdb_db_change *change, const HeldIds &held)
 {
-    const tstr_array *const parts = change->mdc_name_parts;
-    const bool deleted = change->mdc_change_type == mdct_delete;
-    if (bn_binding_name_parts_pattern_match(parts, true, max_tunnels_node)) {
+    if (matches(change, max_tunnels_node)) {
         return limit_fault(dbinfo->newdb);
     }
-    const std::string name = tstr_array_get_str_quick(parts, tunnel_name_part);
-    if (bn_binding_name_parts_pattern_match(parts, true, tunnel_pattern)) {
-        return deleted ? remnant_fault(dbinfo->newdb, name) : name_fault(dbinfo->newdb, name);
+    const std::vector<std::string> parts = name_parts(change);
+    const std::string &name = parts[tunnel_name_part];
+    if (matches(change, tunnel_pattern)) {
+        return is_deleted(change) ? remnant_fault(dbinfo->newdb, name) : name_fault(change, name);
     }
-    return deleted ? std::nullopt
-                   : field_fault(dbinfo, name, tstr_array_get_str_quick(parts, tunnel_field_part),
-                                 held);
+    return is_deleted(change) ? std::nullopt
+                              : field_fault(dbinfo, name, parts[tunnel_field_part], held);
 }
 
 } // namespace ovhost

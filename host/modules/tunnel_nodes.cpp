@@ -1,5 +1,6 @@
 #include "host/modules/tunnel_nodes.h"
 
+#include "host/modules/commit_access.h"
 #include "host/modules/node_access.h"
 #include "host/tree/name.h"
 #include "orvale/md_tunbin_ht.h"
@@ -22,8 +23,7 @@ void copy_text(char (&target)[size], const std::string &text)
 
 bool is_about_a_tunnel(const mdb_db_change &change)
 {
-    return bn_binding_name_parts_pattern_match(change.mdc_name_parts, true, tunnel_pattern) ||
-           bn_binding_name_parts_pattern_match(change.mdc_name_parts, true, tunnel_field_pattern);
+    return matches(&change, tunnel_pattern) || matches(&change, tunnel_field_pattern);
 }
 
 } // namespace

@@ -3,6 +3,7 @@
 #include "framework/appliance.h"
 #include "framework/logging.h"
 #include "host/framework/log_config.h"
+#include "host/modules/commit_access.h"
 #include "host/modules/model.h"
 #include "host/modules/node_access.h"
 #include "host/modules/tunnel_checks.h"
@@ -174,13 +175,13 @@ void TunnelsModule::start(const mdb_db *running)
 int TunnelsModule::check_change(md_dbinfo *dbinfo, mdb_db_change *change)
 {
     const std::optional<std::string> fault = tunnel_fault(dbinfo, change, held_);
-    return fault ? md_commit_set_return_status_msg(dbinfo->commit, 1, fault->c_str()) : 0;
+    return fault ? refuse(dbinfo, *fault) : 0;
 }
 
 int TunnelsModule::check_commit(md_dbinfo *dbinfo, const mdb_db_change_array *changes)
 {
     const std::optional<std::string> fault = complete_tunnels(dbinfo, changes, held_);
-    return fault ? md_commit_set_return_status_msg(dbinfo->commit, 1, fault->c_str()) : 0;
+    return fault ? refuse(dbinfo, *fault) : 0;
 }
 
 int TunnelsModule::apply(const md_dbinfo *dbinfo, const mdb_db_change_array *changes)

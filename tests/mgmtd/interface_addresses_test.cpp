@@ -36,7 +36,7 @@ class Addresses : public InterfaceTest
     {
         std::vector<std::string> texts;
         for (const ovhost::test::LoggedLine &line : log_.lines) {
-            if (line.unit == "interfaces") {
+            if (line.unit == "interface-address") {
                 texts.push_back(line.text);
             }
         }

@@ -3,10 +3,13 @@
 // them); the library's are its own tests' business.
 
 #include "framework/errors.h"
+#include "host/modules/interface_lookup.h"
 #include "host/modules/interface_nodes.h"
+#include "host/modules/map_lookup.h"
 #include "tests/mgmtd/map_fixture.h"
 
 #include <functional>
+#include <stdexcept>
 
 namespace
 {
@@ -138,6 +141,29 @@ TEST_F(ReadFaults, RefuseWhatWouldBeAllowed)
                   erase(rmap("m1/prio/20"));
               }),
               "committed");
+}
+
+// Whoever asks gets an error, and not half the answer.
+TEST_F(ReadFaults, FailQuestions)
+{
+    const mdb_db *const db = configuration_->running_db();
+    const std::function<void()> questions[] = {
+        [db] { (void)list_maps(db); },       [db] { (void)find_acl(db, "used"); },
+        [db] { (void)list_acls(db); },       [db] { (void)check_references(db); },
+        [db] { (void)list_interfaces(db); },
+    };
+    for (const auto &ask : questions) {
+        reads = 0;
+        ask();
+        const unsigned all = reads;
+        EXPECT_GT(all, 0U);
+        for (unsigned at = 1; at <= all; ++at) {
+            reads = 0;
+            failing_read = at;
+            EXPECT_THROW(ask(), std::runtime_error) << at;
+        }
+        failing_read = 0;
+    }
 }
 
 } // namespace
