@@ -45,6 +45,7 @@ int add_reference(const reference_update &update, const char *acl)
     owned_binding reference;
     BAIL_ERROR_FOR(update.function, bn_binding_new_str(reference.out(), path.get(), ba_value,
                                                        bt_uint32, 0, entry.priority));
+    BAIL_NULL_FOR(update.function, reference.get());
     BAIL_ERROR_FOR(update.function, mdb_set_node_binding(update.dbinfo->commit, update.newdb(),
                                                          bsso_modify, 0, reference.get()));
     return 0;
@@ -84,6 +85,7 @@ int remove_reference(const reference_update &update, const char *acl)
     OV_LOG(ov_log_info, "Removing %s", node.get());
     owned_binding reference;
     BAIL_ERROR_FOR(update.function, bn_binding_new_named(reference.out(), node.get()));
+    BAIL_NULL_FOR(update.function, reference.get());
     BAIL_ERROR_FOR(update.function, mdb_set_node_binding(update.dbinfo->commit, update.newdb(),
                                                          bsso_delete, 0, reference.get()));
     return 0;

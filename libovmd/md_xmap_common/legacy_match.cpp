@@ -33,6 +33,7 @@ int add_ipver_to_entry(const ipver_walk &walk, const char *prio, const char *pri
     owned_binding binding;
     BAIL_ERROR_FOR(walk.function,
                    bn_binding_new_str(binding.out(), node.get(), ba_value, bt_string, 0, version));
+    BAIL_NULL_FOR(walk.function, binding.get());
     BAIL_ERROR_FOR(walk.function,
                    mdb_set_node_binding(nullptr, walk.db, bsso_create, 0, binding.get()));
     return 0;

@@ -221,6 +221,7 @@ class entry_upgrade
         owned_binding binding;
         BAIL_ERROR_FOR(function_, bn_binding_new_str(binding.out(), node, ba_value, bt_string, 0,
                                                      match_string_));
+        BAIL_NULL_FOR(function_, binding.get());
         BAIL_ERROR_FOR(function_,
                        mdb_set_node_binding(nullptr, new_db_, bsso_modify, 0, binding.get()));
         return 0;

@@ -188,6 +188,8 @@ FaultRow enable_row()
     const Outcome unchanged = {"0; /net/interface/config/wan0 string wan0"};
     const Outcome failed = {"{code}; /net/interface/config/wan0 string wan0",
                             {unit.bail(function)}};
+    const Outcome without_binding = {"14001; /net/interface/config/wan0 string wan0",
+                                     {unit.unexpected_null(function)}};
     return {
         function,
         "of_an_interface",
@@ -207,6 +209,7 @@ FaultRow enable_row()
         {{fails(Operation::mdb_get_node_binding), failed},
          {hands_out_nothing(Operation::mdb_get_node_binding), unchanged},
          {fails(Operation::bn_binding_new_str), failed},
+         {hands_out_nothing(Operation::bn_binding_new_str), without_binding},
          {fails(Operation::mdb_set_node_binding), failed}}};
 }
 

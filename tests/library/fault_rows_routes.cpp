@@ -72,6 +72,11 @@ FaultRow deletion_row()
         failures.push_back({fails(step, 2), {"{code} 0" + later, {first, bail}}});
         failures.push_back({fails(step, 3), {"{code} 0" + later, {first, bail}}});
     }
+    const Operation binding = Operation::bn_binding_new_str;
+    const ExpectedLine null = unit.unexpected_null(function);
+    failures.push_back({hands_out_nothing(binding, 1), {"14001 0" + all, {null}}});
+    failures.push_back({hands_out_nothing(binding, 2), {"14001 0" + later, {first, null}}});
+    failures.push_back({hands_out_nothing(binding, 3), {"14001 0" + later, {first, null}}});
     return {function, "of_two_prefixes", with_two_prefixes, deletion, success, failures};
 }
 

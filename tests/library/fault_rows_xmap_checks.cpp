@@ -165,26 +165,28 @@ FaultRow row_of_first_acl()
     const Outcome success = {std::string("0") + reference_2, lines};
     const Outcome no_acl = {
         "0", {modify_line, acl_path_line, gated(6, "refcheck: acl=(null), m1-10, old=(null)")}};
-    return {references_function,
-            "of_a_first_acl",
-            as_it_is,
-            [](HostFixture &) {
-                MapCommit commit;
-                return acl_set(commit, "a2");
-            },
+    return {
+        references_function,
+        "of_a_first_acl",
+        as_it_is,
+        [](HostFixture &) {
+            MapCommit commit;
+            return acl_set(commit, "a2");
+        },
+        success,
+        with_trace_failures(
             success,
-            with_trace_failures(
-                success,
-                {{fails(Operation::bn_binding_name_parts_pattern_match), {"0"}},
-                 {fails(Operation::bn_attrib_array_get_attrib_tstr),
-                  {"{code}", up_to(lines, 1, {bail})}},
-                 {hands_out_nothing(Operation::bn_attrib_array_get_attrib_tstr), no_acl},
-                 {fails(Operation::smprintf, 1), {"14001", up_to(lines, 1, {null})}},
-                 {fails(Operation::mdb_get_node_binding), {"{code}", up_to(lines, 2, {bail})}},
-                 {hands_out_nothing(Operation::mdb_get_node_binding), success},
-                 {fails(Operation::smprintf, 2), {"14001", up_to(lines, 3, {null})}},
-                 {fails(Operation::bn_binding_new_str), {"{code}", up_to(lines, 5, {bail})}},
-                 {fails(Operation::mdb_set_node_binding), {"{code}", up_to(lines, 5, {bail})}}})};
+            {{fails(Operation::bn_binding_name_parts_pattern_match), {"0"}},
+             {fails(Operation::bn_attrib_array_get_attrib_tstr),
+              {"{code}", up_to(lines, 1, {bail})}},
+             {hands_out_nothing(Operation::bn_attrib_array_get_attrib_tstr), no_acl},
+             {fails(Operation::smprintf, 1), {"14001", up_to(lines, 1, {null})}},
+             {fails(Operation::mdb_get_node_binding), {"{code}", up_to(lines, 2, {bail})}},
+             {hands_out_nothing(Operation::mdb_get_node_binding), success},
+             {fails(Operation::smprintf, 2), {"14001", up_to(lines, 3, {null})}},
+             {fails(Operation::bn_binding_new_str), {"{code}", up_to(lines, 5, {bail})}},
+             {hands_out_nothing(Operation::bn_binding_new_str), {"14001", up_to(lines, 5, {null})}},
+             {fails(Operation::mdb_set_node_binding), {"{code}", up_to(lines, 5, {bail})}}})};
 }
 
 // The new reference stays whatever becomes of the old one.
@@ -239,6 +241,8 @@ FaultRow row_of_another_acl()
              {fails(Operation::smprintf, 2), {"14001" + as_before, up_to(lines, 3, {null})}},
              {fails(Operation::bn_binding_new_str),
               {"{code}" + as_before, up_to(lines, 5, {bail})}},
+             {hands_out_nothing(Operation::bn_binding_new_str),
+              {"14001" + as_before, up_to(lines, 5, {null})}},
              {fails(Operation::mdb_set_node_binding, 1),
               {"{code}" + as_before, up_to(lines, 5, {bail})}},
              {fails(Operation::smprintf, 3), {"14001" + both, up_to(lines, 5, {null})}},
@@ -246,6 +250,8 @@ FaultRow row_of_another_acl()
              {hands_out_nothing(Operation::mdb_get_tstr_array), success},
              {fails(Operation::smprintf, 4), {"14001" + both, up_to(lines, 6, {null})}},
              {fails(Operation::bn_binding_new_named), {"{code}" + both, up_to(lines, 8, {bail})}},
+             {hands_out_nothing(Operation::bn_binding_new_named),
+              {"14001" + both, up_to(lines, 8, {null})}},
              {fails(Operation::mdb_set_node_binding, 2),
               {"{code}" + both, up_to(lines, 8, {bail})}}})};
 }
@@ -284,6 +290,8 @@ std::vector<FailureRow> removal_failures(const Outcome &success, const Lines &no
          {fails(Operation::smprintf, 3), {"14001" + as_before, up_to(lines, begin + 1, {null})}},
          {fails(Operation::bn_binding_new_named),
           {"{code}" + as_before, up_to(lines, begin + 3, {bail})}},
+         {hands_out_nothing(Operation::bn_binding_new_named),
+          {"14001" + as_before, up_to(lines, begin + 3, {null})}},
          {fails(Operation::mdb_set_node_binding),
           {"{code}" + as_before, up_to(lines, begin + 3, {bail})}}});
 }

@@ -108,50 +108,54 @@ FaultRow ipver_row()
     const ExpectedLine null = unit.unexpected_null(function);
     const Lines at_first = {one_map, prio, two_entries, first};
     const Lines at_second = at_first + Lines{second};
-    return {function,
-            "of_two_entries",
-            [](HostFixture &host) {
-                host.set(route_root + "/m/prio/10/seq", bt_string, "x");
-                host.set(route_root + "/m/prio/65535/seq", bt_string, "x");
-            },
-            [](HostFixture &host) {
-                mdb_db db = writable_copy(host);
-                std::string answer =
-                    std::to_string(in_library(md_xmap_add_ipver, &db, route_root.c_str()));
-                for (const char *priority : {"10", "65535"}) {
-                    const std::string entry = route_root + "/m/prio/" + priority + "/match/0/ipver";
-                    for (const std::string &node : nodes(db, entry)) {
-                        answer += std::string(", ") + priority + node.substr(entry.size());
-                    }
+    return {
+        function,
+        "of_two_entries",
+        [](HostFixture &host) {
+            host.set(route_root + "/m/prio/10/seq", bt_string, "x");
+            host.set(route_root + "/m/prio/65535/seq", bt_string, "x");
+        },
+        [](HostFixture &host) {
+            mdb_db db = writable_copy(host);
+            std::string answer =
+                std::to_string(in_library(md_xmap_add_ipver, &db, route_root.c_str()));
+            for (const char *priority : {"10", "65535"}) {
+                const std::string entry = route_root + "/m/prio/" + priority + "/match/0/ipver";
+                for (const std::string &node : nodes(db, entry)) {
+                    answer += std::string(", ") + priority + node.substr(entry.size());
                 }
-                return answer;
-            },
-            {"0, 10 string ipv4, 65535 string any", at_second},
-            {{fails(Operation::mdb_get_tstr_array, 1), {"{code}", {bail}}},
-             {fails(Operation::mdb_get_tstr_array, 2), {"{code}", {one_map, prio, bail}}},
-             {hands_out_nothing(Operation::mdb_get_tstr_array, 1),
-              {"0", {gated(6, "md_xmap_add_ipver: num maps: 0")}}},
-             {hands_out_nothing(Operation::mdb_get_tstr_array, 2),
-              {"0", {one_map, prio, gated(6, "md_xmap_add_ipver: num prios for m: 0")}}},
-             {fails(Operation::smprintf, 1), {"14001", {one_map, null}}},
-             {fails(Operation::smprintf, 2), {"14001", {one_map, prio, two_entries, null}}},
-             {fails(Operation::smprintf, 3), {"14001, 10 string ipv4", at_first + Lines{null}}},
-             {fails_once(Operation::lc_log_check_level, 1),
-              {"0, 10 string ipv4, 65535 string any", {one_map, two_entries, first, second}}},
-             {fails_once(Operation::lc_log_check_level, 2),
-              {"0, 10 string ipv4, 65535 string any", {one_map, prio, two_entries, second}}},
-             {fails_from(Operation::lc_log_check_level, 1),
-              {"0, 10 string ipv4, 65535 string any", {one_map, two_entries}}},
-             {fails_from(Operation::lc_log_check_level, 2),
-              {"0, 10 string ipv4, 65535 string any", {one_map, prio, two_entries}}},
-             {fails(Operation::lc_log_check_level, 3),
-              {"0, 10 string ipv4, 65535 string any", at_first}},
-             {fails(Operation::bn_binding_new_str, 1), {"{code}", at_first + Lines{bail}}},
-             {fails(Operation::bn_binding_new_str, 2),
-              {"{code}, 10 string ipv4", at_second + Lines{bail}}},
-             {fails(Operation::mdb_set_node_binding, 1), {"{code}", at_first + Lines{bail}}},
-             {fails(Operation::mdb_set_node_binding, 2),
-              {"{code}, 10 string ipv4", at_second + Lines{bail}}}}};
+            }
+            return answer;
+        },
+        {"0, 10 string ipv4, 65535 string any", at_second},
+        {{fails(Operation::mdb_get_tstr_array, 1), {"{code}", {bail}}},
+         {fails(Operation::mdb_get_tstr_array, 2), {"{code}", {one_map, prio, bail}}},
+         {hands_out_nothing(Operation::mdb_get_tstr_array, 1),
+          {"0", {gated(6, "md_xmap_add_ipver: num maps: 0")}}},
+         {hands_out_nothing(Operation::mdb_get_tstr_array, 2),
+          {"0", {one_map, prio, gated(6, "md_xmap_add_ipver: num prios for m: 0")}}},
+         {fails(Operation::smprintf, 1), {"14001", {one_map, null}}},
+         {fails(Operation::smprintf, 2), {"14001", {one_map, prio, two_entries, null}}},
+         {fails(Operation::smprintf, 3), {"14001, 10 string ipv4", at_first + Lines{null}}},
+         {fails_once(Operation::lc_log_check_level, 1),
+          {"0, 10 string ipv4, 65535 string any", {one_map, two_entries, first, second}}},
+         {fails_once(Operation::lc_log_check_level, 2),
+          {"0, 10 string ipv4, 65535 string any", {one_map, prio, two_entries, second}}},
+         {fails_from(Operation::lc_log_check_level, 1),
+          {"0, 10 string ipv4, 65535 string any", {one_map, two_entries}}},
+         {fails_from(Operation::lc_log_check_level, 2),
+          {"0, 10 string ipv4, 65535 string any", {one_map, prio, two_entries}}},
+         {fails(Operation::lc_log_check_level, 3),
+          {"0, 10 string ipv4, 65535 string any", at_first}},
+         {fails(Operation::bn_binding_new_str, 1), {"{code}", at_first + Lines{bail}}},
+         {fails(Operation::bn_binding_new_str, 2),
+          {"{code}, 10 string ipv4", at_second + Lines{bail}}},
+         {hands_out_nothing(Operation::bn_binding_new_str, 1), {"14001", at_first + Lines{null}}},
+         {hands_out_nothing(Operation::bn_binding_new_str, 2),
+          {"14001, 10 string ipv4", at_second + Lines{null}}},
+         {fails(Operation::mdb_set_node_binding, 1), {"{code}", at_first + Lines{bail}}},
+         {fails(Operation::mdb_set_node_binding, 2),
+          {"{code}, 10 string ipv4", at_second + Lines{bail}}}}};
 }
 
 void with_application(HostFixture &host)

@@ -130,7 +130,9 @@ std::vector<FailureRow> common_failures(const Fields &fields, const std::string 
     const Lines at_end = {converted(match_string), unit.bail(upgrade_function)};
     return {{fails(Operation::mdb_get_tstr_array), failed(fields, 0)},
             {hands_out_nothing(Operation::mdb_get_tstr_array), {"0" + kept(fields, 0)}},
-            {fails(Operation::bn_binding_new_str), {"{code}, kept:", at_end}}};
+            {fails(Operation::bn_binding_new_str), {"{code}, kept:", at_end}},
+            {hands_out_nothing(Operation::bn_binding_new_str),
+             {"14001, kept:", {converted(match_string), unit.unexpected_null(upgrade_function)}}}};
 }
 
 // Each failing removal is told, and the field stays.

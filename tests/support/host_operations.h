@@ -41,8 +41,8 @@ enum class OperationKind {
     ROW(status, mdb_set_node_binding, 5)                                                           \
     ROW(steady, mdb_db_change_array_length_quick, 1)                                               \
     ROW(pointer, mdb_db_change_array_get_quick, 2)                                                 \
-    ROW(status, bn_binding_new_str, 6)                                                             \
-    ROW(status, bn_binding_new_named, 2)                                                           \
+    ROW(query, bn_binding_new_str, 6)                                                              \
+    ROW(query, bn_binding_new_named, 2)                                                            \
     ROW(steady, bn_binding_free, 1)                                                                \
     ROW(query, bn_binding_get_str, 5)                                                              \
     ROW(status, bn_binding_get_uint32, 4)                                                          \
