@@ -30,11 +30,12 @@ OV_API int md_ifmgr_get_ifcount(void);
  * number of layer-3 interfaces, and the kernel's interfaces with theirs must stay below
  * MD_IFMGR_IFINDEX_BUDGET. Both sums are unsigned 32-bit numbers. The count itself is not changed.
  *
- * changes     the commit's changes; null entries are passed over
+ * changes     the commit's changes; null entries and entries without a name are passed over
  * bpattern    matches the names of the nodes of which each stands for one interface
  * multiplier  how many of the kernel's interfaces each new one takes
- * Returns true when they fit, or when there are none; false also when a pointer is null. Where the
- * model's information cannot be had, its number of interfaces is what ov_system_info holds.
+ * Returns true when they fit, or when there are none; false also when changes is null, and when
+ * bpattern is while there are changes. Where the model's information cannot be had, its number of
+ * interfaces is what ov_system_info holds.
  */
 OV_API tbool md_ifmgr_can_interface_be_added(mdb_db_change_array *changes, const char *bpattern,
                                              int multiplier);

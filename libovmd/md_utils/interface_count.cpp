@@ -3,6 +3,7 @@
 
 #include "framework/appliance.h"
 #include "framework/bail.h"
+#include "libovmd/frame/absent.h"
 #include "libovmd/md_utils/unit.h"
 
 namespace
@@ -36,11 +37,14 @@ uint32 max_interfaces()
     return ov_system_info.system_max_interfaces;
 }
 
-bool adds_interface(const mdb_db_change *change, const char *bpattern)
+// The name of the node when it stands for a new interface; else null.
+const char *new_interface(const mdb_db_change *change, const char *bpattern)
 {
-    return change != nullptr &&
-           bn_binding_name_pattern_match(ts_str(change->mdc_name), bpattern) &&
-           change->mdc_change_type == mdct_add;
+    const char *const name = change != nullptr ? ovmd::text_of(change->mdc_name) : nullptr;
+    return name != nullptr && bn_binding_name_pattern_match(name, bpattern) &&
+                   change->mdc_change_type == mdct_add
+               ? name
+               : nullptr;
 }
 
 } // namespace
@@ -57,12 +61,11 @@ tbool md_ifmgr_can_interface_be_added(mdb_db_change_array *changes, const char *
     BAIL_NULL_ANSWER(bpattern, false);
     uint32 count = 0;
     for (int32 i = 0; i < num_changes; ++i) {
-        const mdb_db_change *const change =
-            mdb_db_change_array_get_quick(changes, static_cast<uint32>(i));
-        if (adds_interface(change, bpattern)) {
+        const char *const name =
+            new_interface(mdb_db_change_array_get_quick(changes, static_cast<uint32>(i)), bpattern);
+        if (name != nullptr) {
             ++count;
-            OV_LOG_MODULE(change_cap, "Interfaces %s being added. count=%d",
-                          ts_str(change->mdc_name), count);
+            OV_LOG_MODULE(change_cap, "Interfaces %s being added. count=%d", name, count);
         }
     }
     if (count == 0) {

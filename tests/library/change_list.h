@@ -18,6 +18,11 @@ class ChangeList
         list_.changes.emplace_back(records_.emplace_back(change_type, name).record(), leave);
     }
     void add_null() { list_.changes.emplace_back(nullptr, leave); }
+    void add_nameless(int change_type)
+    {
+        nameless_.mdc_change_type = change_type;
+        list_.changes.emplace_back(&nameless_, leave);
+    }
 
     mdb_db_change_array *get() { return &list_; }
 
@@ -26,6 +31,7 @@ class ChangeList
     static void leave(mdb_db_change * /*record*/) {}
 
     std::list<MapChange> records_;
+    mdb_db_change nameless_ = {};
     mdb_db_change_array list_;
 };
 

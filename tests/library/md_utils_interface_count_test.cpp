@@ -318,6 +318,19 @@ TEST_F(Admission, IsGrantedWithoutAskingWhenNothingIsAdded)
     EXPECT_EQ(g_ovif_skfd, -1);
 }
 
+TEST_F(Admission, PassesOverChangesWithoutAName)
+{
+    ChangeList changes;
+    changes.add_nameless(mdct_add);
+    changes.add(mdct_add, std::string(vlan_root) + "b");
+    EXPECT_TRUE(fits(changes));
+    EXPECT_EQ(num_calls(Operation::bn_binding_name_pattern_match), 1U);
+    EXPECT_THAT(log_lines(),
+                ElementsAre(added_line(std::string(vlan_root) + "b", 1),
+                            summary_line("1 changes; cur l3:0 ifidx:10 mult:1 max:8")));
+    EXPECT_THAT(misuses(), IsEmpty());
+}
+
 TEST_F(Admission, OfNullEntriesAloneIsGranted)
 {
     ChangeList changes;
