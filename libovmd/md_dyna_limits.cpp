@@ -29,7 +29,6 @@ constexpr limit_line limit_lines[] = {
     {"/ov/tunneld/system/config/limits/cifs_flows", "max_cifs_conns"},
     {"/ov/tunneld/system/config/limits/ssl_flows", "max_ssl_flows"},
     {"/ov/tunneld/system/config/limits/nm_ram_size", "nm_ram_size"},
-    {nullptr, nullptr},
 };
 
 // The file while it is being written. Readers find all lines or no file: unless finish() succeeds,
@@ -96,14 +95,14 @@ int write_dyna_limits_conf(const mdb_db *new_db)
 
     limits_file file;
     BAIL_NULL(file.get());
-    for (const limit_line *line = limit_lines; line->node != nullptr; ++line) {
+    for (const limit_line &line : limit_lines) {
         uint32 limit = 0;
-        const int err = read_limit(__func__, new_db, line->node, limit);
+        const int err = read_limit(__func__, new_db, line.node, limit);
         if (err != 0) {
             return err;
         }
         // The format is signed: a limit beyond its range stands there as a negative number.
-        (void)fprintf(file.get(), "%s %d\n", line->key, static_cast<int32>(limit));
+        (void)fprintf(file.get(), "%s %d\n", line.key, static_cast<int32>(limit));
     }
     BAIL_ERROR(file.finish());
     return 0;

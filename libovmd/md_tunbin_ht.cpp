@@ -44,12 +44,20 @@ ht_tun_info_t info_of(const tunnel_config_bin_t &tunnel)
     return info;
 }
 
-int refuse_id(const char *function, uint32 tid)
+// The record that a caller hands over, null when there is none to work on: no record is not an
+// error, one whose ID is out of range is. Reports in the exported function's name.
+int take_record(const char *function, const void *vtunbin, const tunnel_config_bin_t *&ret_tunnel)
 {
-    (void)BAIL_LOG_AT(function, bail_unit, __LINE__, "%s: tunbin has invalid tunnel id %d",
-                      function, tid);
-    bail_debug();
-    return lc_err_generic_error;
+    ret_tunnel = nullptr;
+    const auto *const tunnel = static_cast<const tunnel_config_bin_t *>(vtunbin);
+    if (tunnel != nullptr && tunnel->tp_tunnel_id >= MD_TUNBIN_HT_SIZE) {
+        (void)BAIL_LOG_AT(function, bail_unit, __LINE__, "%s: tunbin has invalid tunnel id %d",
+                          function, tunnel->tp_tunnel_id);
+        bail_debug();
+        return lc_err_generic_error;
+    }
+    ret_tunnel = tunnel;
+    return 0;
 }
 
 void dump_cache()
@@ -87,14 +95,12 @@ int md_tunbin_ht_init(void)
 
 int md_tunbin_ht_add(const void *vtunbin)
 {
-    const auto *const tunnel = static_cast<const tunnel_config_bin_t *>(vtunbin);
+    const tunnel_config_bin_t *tunnel = nullptr;
+    const int err = take_record(__func__, vtunbin, tunnel);
     if (tunnel == nullptr) {
-        return 0;
+        return err;
     }
     const uint32 tid = tunnel->tp_tunnel_id;
-    if (tid >= MD_TUNBIN_HT_SIZE) {
-        return refuse_id(__func__, tid);
-    }
     ht_tun_info_t &slot = ht_tun_infos[tid];
     slot = info_of(*tunnel);
     tunbin_tunname_ht_add(slot.name, tid);
@@ -107,14 +113,12 @@ int md_tunbin_ht_add(const void *vtunbin)
 
 int md_tunbin_ht_del(const void *vtunbin)
 {
-    const auto *const tunnel = static_cast<const tunnel_config_bin_t *>(vtunbin);
+    const tunnel_config_bin_t *tunnel = nullptr;
+    const int err = take_record(__func__, vtunbin, tunnel);
     if (tunnel == nullptr) {
-        return 0;
+        return err;
     }
     const uint32 tid = tunnel->tp_tunnel_id;
-    if (tid >= MD_TUNBIN_HT_SIZE) {
-        return refuse_id(__func__, tid);
-    }
     ht_tun_info_t info = info_of(*tunnel);
     empty_slot(ht_tun_infos[tid]);
     tunbin_tunname_ht_del(info.name);

@@ -89,11 +89,11 @@ int search_entries(app_search &search, const char *entries_path, const tstr_arra
     return 0;
 }
 
-int search_acl(app_search &search, const char *acl)
+int search_acl(app_search &search, const char *root, const char *acl)
 {
     BAIL_NULL_FOR(search.function, acl);
     char path[list_path_size];
-    (void)snprintf(path, sizeof path, "%s/%s/entry", acl_root, acl);
+    (void)snprintf(path, sizeof path, "%s/%s/entry", root, acl);
     owned_tstr_array entries;
     const int err = list_children(search, path, entries);
     return err != 0 ? err : search_entries(search, path, entries.get(), "application");
@@ -117,11 +117,33 @@ int search_map(app_search &search, const char *root, const char *map)
     return search_entries(search, path, entries.get(), "match/0/application");
 }
 
-void tell(const app_search &search, tbool *found)
+// What is searched one by one: the ACLs, or one kind's maps.
+struct app_holders {
+    const char *root;
+    const char *plural;
+    int (*search)(app_search &search, const char *root, const char *holder);
+};
+
+int search_holders(app_search &search, const app_holders &holders, tbool *ret_found)
 {
-    if (found != nullptr) {
-        *found = search.found;
+    owned_tstr_array names;
+    int err = list_children(search, holders.root, names);
+    if (err != 0) {
+        return err;
     }
+    const uint32 num_names = length_of(names.get());
+    OV_LOG(ov_log_info, "%s: find %s in any %d %s", search.function, search.app_name, num_names,
+           holders.plural);
+    for (uint32 i = 0; i < num_names && !search.is_over(); ++i) {
+        err = holders.search(search, holders.root, tstr_array_get_str_quick(names.get(), i));
+        if (err != 0) {
+            return err;
+        }
+    }
+    if (ret_found != nullptr) {
+        *ret_found = search.found;
+    }
+    return 0;
 }
 
 int read_rule_name(const char *function, const mdb_db *db, const char *rule, owned_tstring &name)
@@ -140,21 +162,7 @@ int md_find_app_name_in_acl(const char *appName, const mdb_db *db, tbool *found,
 {
     BAIL_NULL(db);
     app_search search = {__func__, appName, db, bnames, false};
-    owned_tstr_array acls;
-    int err = list_children(search, acl_root, acls);
-    if (err != 0) {
-        return err;
-    }
-    const uint32 num_acls = length_of(acls.get());
-    OV_LOG(ov_log_info, "%s: find %s in any %d acl aclNames", __func__, appName, num_acls);
-    for (uint32 i = 0; i < num_acls && !search.is_over(); ++i) {
-        err = search_acl(search, tstr_array_get_str_quick(acls.get(), i));
-        if (err != 0) {
-            return err;
-        }
-    }
-    tell(search, found);
-    return 0;
+    return search_holders(search, {acl_root, "acl aclNames", search_acl}, found);
 }
 
 int md_find_app_name_in_xxxmap(const char *appName, const mdb_db *db, const char *mapNamePrefix,
@@ -163,21 +171,7 @@ int md_find_app_name_in_xxxmap(const char *appName, const mdb_db *db, const char
     BAIL_NULL(db);
     BAIL_NULL(mapNamePrefix);
     app_search search = {__func__, appName, db, bnames, false};
-    owned_tstr_array maps;
-    int err = list_children(search, mapNamePrefix, maps);
-    if (err != 0) {
-        return err;
-    }
-    const uint32 num_maps = length_of(maps.get());
-    OV_LOG(ov_log_info, "%s: find %s in any %d map names", __func__, appName, num_maps);
-    for (uint32 i = 0; i < num_maps && !search.is_over(); ++i) {
-        err = search_map(search, mapNamePrefix, tstr_array_get_str_quick(maps.get(), i));
-        if (err != 0) {
-            return err;
-        }
-    }
-    tell(search, found);
-    return 0;
+    return search_holders(search, {mapNamePrefix, "map names", search_map}, found);
 }
 
 int md_find_appname_in_acl_or_xxxmap(const char *appName, const mdb_db *db, char **existsInString,
@@ -266,6 +260,7 @@ int md_get_custom_app_names(const mdb_db *db, tstr_array **names)
         }
         BAIL_ERROR(tstr_array_append_str(found.get(), ts_str(name.get())));
     }
+    // Not the working array, as in md_get_vlan_interfaces.
     tstr_array *copy = nullptr;
     BAIL_ERROR(tstr_array_duplicate(found.get(), &copy));
     *names = copy;

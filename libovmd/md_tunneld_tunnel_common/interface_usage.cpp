@@ -197,6 +197,8 @@ int md_get_vlan_interfaces(const mdb_db *db, tstr_array **ifnames)
             return err;
         }
     }
+    // Not the working array: that the host makes the caller's, and may fail to, is part of what
+    // this function does for it.
     owned_tstr_array copy;
     BAIL_ERROR(tstr_array_duplicate(names.get(), copy.out()));
     *ifnames = copy.release();

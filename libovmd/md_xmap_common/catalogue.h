@@ -1,6 +1,8 @@
-// The kinds of policy maps, one row each: all that tells one kind from another.
+// The kinds of policy maps, one row each: all that tells one kind from another, so that adding a
+// kind is adding a row.
 //
-// Adding a kind is adding a row. What the rows are for is told by the files beside this one.
+// Every other file of this folder asks it which nodes belong to a kind; md_tunneld_tunnel_common
+// takes the roots of the maps that may name an application from it.
 #pragma once
 
 #include "framework/appliance.h"
@@ -75,6 +77,35 @@ inline constexpr map_type map_types[] = {
 
 #undef OVMD_SEC_MAP
 #undef OVMD_REGULAR_MAP_TYPE
+
+constexpr bool is_same_text(const char *left, const char *right)
+{
+    while (*left != '\0' && *left == *right) {
+        ++left;
+        ++right;
+    }
+    return *left == *right;
+}
+
+// A second row of a kind would never be found; kinds of one key would share their references.
+constexpr bool are_distinct(const map_type &left, const map_type &right)
+{
+    return left.mtype != right.mtype && !is_same_text(left.root, right.root) &&
+           (left.key == nullptr || right.key == nullptr || !is_same_text(left.key, right.key));
+}
+
+constexpr bool all_distinct()
+{
+    for (const map_type &row : map_types) {
+        for (const map_type &other : map_types) {
+            if (&row != &other && !are_distinct(row, other)) {
+                return false;
+            }
+        }
+    }
+    return true;
+}
+static_assert(all_distinct(), "two map types share a number, a key or a root");
 
 // Null for an unknown kind.
 constexpr const map_type *find_map_type(int mtype)
