@@ -5,8 +5,8 @@
 // A kind of work has a class of its data, made once for each size. Work that changes a database
 // has `newdb`, which begin() makes as it was.
 
+#include "bench/database.h"
 #include "bench/goals.h"
-#include "bench/owned.h"
 #include "host/tree/diff.h"
 
 #include <benchmark/benchmark.h>

@@ -6,6 +6,7 @@
 #include "bench/policy_maps.h"
 #include "framework/addresses.h"
 #include "framework/logging.h"
+#include "host/framework/owners.h"
 #include "orvale/md_xmap_common.h"
 
 #include <array>
@@ -17,6 +18,10 @@ namespace
 {
 
 using namespace ovbench;
+using ovhost::OwnedBinding;
+using ovhost::OwnedString;
+using ovhost::OwnedStrings;
+using ovhost::OwnedText;
 
 constexpr char entry_pattern[] = "/ov/tunneld/route_map/config/map/*/prio/*";
 

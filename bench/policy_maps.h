@@ -1,8 +1,9 @@
 #pragma once
 // Route maps of many entries, and commits that change them.
 
-#include "bench/owned.h"
+#include "bench/database.h"
 #include "framework/md_commit.h"
+#include "host/framework/owners.h"
 
 #include <string>
 #include <vector>
@@ -56,8 +57,8 @@ class NodeChange
     [[nodiscard]] const tstr_array *parts() const { return parts_.get(); }
 
   private:
-    OwnedString name_;
-    OwnedStrings parts_;
+    ovhost::OwnedString name_;
+    ovhost::OwnedStrings parts_;
     bn_attrib_array new_attribs_;
     mdb_db_change record_ = {};
 };

@@ -5,6 +5,7 @@
 #include "bench/bare_work.h"
 #include "framework/addresses.h"
 #include "framework/logging.h"
+#include "host/framework/owners.h"
 #include "orvale/md_tunneld_tunnel_common.h"
 
 #include <string>
@@ -14,6 +15,9 @@ namespace
 {
 
 using namespace ovbench;
+using ovhost::OwnedBinding;
+using ovhost::OwnedString;
+using ovhost::OwnedStrings;
 
 constexpr char group_root[] = "/ov/wccpd/wccp/srv_grp/config";
 constexpr char vrrp_root[] = "/ov/redd/net/interface/vrrp/config";

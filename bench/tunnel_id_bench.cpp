@@ -1,6 +1,7 @@
 // Finding a tunnel's ID by its name among 10,000: the library's search beside the one that compares
 // the name of every record.
 
+#include "bench/database.h"
 #include "bench/goals.h"
 #include "bench/tunnel_names.h"
 #include "framework/appliance.h"
@@ -15,7 +16,6 @@
 #include <cstdlib>
 #include <memory>
 #include <random>
-#include <stdexcept>
 #include <string>
 #include <vector>
 
@@ -26,13 +26,6 @@ using namespace ovbench;
 
 constexpr std::size_t num_tunnels = 10'000;
 constexpr std::size_t first_unknown = 500'000;
-
-void require(bool holds, const char *what)
-{
-    if (!holds) {
-        throw std::runtime_error(what);
-    }
-}
 
 void set_max_tunnels()
 {

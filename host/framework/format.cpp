@@ -5,10 +5,10 @@
 namespace ovhost
 {
 
-OwnedText print_text(const char *format, va_list arguments) noexcept
+PrintedText print_text(const char *format, va_list arguments) noexcept
 {
     char *text = nullptr;
-    return OwnedText(::vasprintf(&text, format, arguments) < 0 ? nullptr : text);
+    return PrintedText(::vasprintf(&text, format, arguments) < 0 ? nullptr : text);
 }
 
 } // namespace ovhost

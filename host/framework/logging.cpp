@@ -160,7 +160,7 @@ int lc_log_internal(const char *function, const char *unit, int line, uint32 fla
     }
     va_list arguments;
     va_start(arguments, format);
-    const ovhost::OwnedText text = ovhost::print_text(format, arguments);
+    const ovhost::PrintedText text = ovhost::print_text(format, arguments);
     va_end(arguments);
     if (!text) {
         return lc_err_generic_error;
@@ -186,7 +186,7 @@ void ov_log_internal(int level, const char *function, int zero, const char *form
     }
     va_list arguments;
     va_start(arguments, format);
-    const ovhost::OwnedText text = ovhost::print_text(format, arguments);
+    const ovhost::PrintedText text = ovhost::print_text(format, arguments);
     va_end(arguments);
     if (text) {
         (void)ovhost::emit({.level = level,

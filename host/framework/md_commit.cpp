@@ -32,7 +32,7 @@ int md_commit_set_return_status_msg_fmt(md_commit *commit, int code, const char 
     }
     va_list arguments;
     va_start(arguments, format);
-    const ovhost::OwnedText text = ovhost::print_text(format, arguments);
+    const ovhost::PrintedText text = ovhost::print_text(format, arguments);
     va_end(arguments);
     return text ? refuse(*commit, code, text.get()) : lc_err_generic_error;
 }

@@ -147,7 +147,7 @@ int mdb_set_node_str(md_commit * /*commit*/, mdb_db *db, int op, uint32 /*flags*
     }
     va_list arguments;
     va_start(arguments, name_format);
-    const ovhost::OwnedText name = ovhost::print_text(name_format, arguments);
+    const ovhost::PrintedText name = ovhost::print_text(name_format, arguments);
     va_end(arguments);
     if (!name) {
         return lc_err_generic_error;

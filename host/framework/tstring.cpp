@@ -64,7 +64,7 @@ int ts_new_sprintf(tstring **ret, const char *format, ...)
     }
     va_list arguments;
     va_start(arguments, format);
-    const ovhost::OwnedText text = ovhost::print_text(format, arguments);
+    const ovhost::PrintedText text = ovhost::print_text(format, arguments);
     va_end(arguments);
     return text ? ts_new_str(ret, text.get()) : lc_err_generic_error;
 }
@@ -134,7 +134,7 @@ char *smprintf(const char *format, ...)
     }
     va_list arguments;
     va_start(arguments, format);
-    ovhost::OwnedText text = ovhost::print_text(format, arguments);
+    ovhost::PrintedText text = ovhost::print_text(format, arguments);
     va_end(arguments);
     return text.release();
 }

@@ -1,17 +1,11 @@
-#include "bench/owned.h"
+#include "bench/database.h"
 
 #include "host/tree/name.h"
 
-#include <cstdlib>
 #include <stdexcept>
 
 namespace ovbench
 {
-
-void free_text(char **text)
-{
-    std::free(*text);
-}
 
 void require(bool holds, const char *what)
 {
