@@ -16,6 +16,9 @@ namespace
 
 using namespace e2e;
 using namespace std::chrono_literals;
+using std::chrono::floor;
+using std::chrono::seconds;
+using std::chrono::system_clock;
 using testing::AllOf;
 using testing::ElementsAre;
 using testing::EndsWith;
@@ -217,9 +220,9 @@ TEST_F(History, UndoesWhatIsNotConfirmed)
     start();
     make_history();
     set("/x", "trial");
-    EXPECT_EQ(ovctl({"commit", "--confirm", "3"}),
+    EXPECT_EQ(ovctl({"commit", "--confirm", "2"}),
               done("commit 4: 1 change\n"
-                   "commit 4 is undone in 3 seconds unless confirmed: run ovctl confirm\n"));
+                   "commit 4 is undone in 2 seconds unless confirmed: run ovctl confirm\n"));
     EXPECT_EQ(value("/x"), "/x string trial\n");
     set("/mine", "kept");
     await("commit 4 was not confirmed in time");
@@ -267,13 +270,17 @@ TEST_F(History, KeepsWhatIsConfirmed)
 {
     start();
     set("/x", "trial");
-    ASSERT_EQ(ovctl({"commit", "--confirm", "3"}).exit_code, 0);
+    ASSERT_EQ(ovctl({"commit", "--confirm", "2"}).exit_code, 0);
     EXPECT_THAT(ovctl({"status"}).out, HasSubstr("commit 2 is undone in "));
     EXPECT_EQ(ovctl({"confirm"}), done("commit 2 is confirmed\n"));
     EXPECT_THAT(ovctl({"status"}).out, Not(HasSubstr("undone")));
-    std::this_thread::sleep_for(3500ms);
+    // The time of a later commit is over after that of the confirmed one.
+    set("/y", "trial");
+    ASSERT_EQ(ovctl({"commit", "--confirm", "2"}).exit_code, 0);
+    await("commit 3 was not confirmed in time");
     EXPECT_EQ(value("/x"), "/x string trial\n");
-    EXPECT_THAT(remarks({"--limit", "1"}), ElementsAre("2: [confirmed]"));
+    EXPECT_THAT(remarks({"--limit", "3"}), ElementsAre("4: undo of commit 3, not confirmed in time",
+                                                       "3: [undone by 4]", "2: [confirmed]"));
 }
 
 TEST_F(History, IsConfirmedByTheNextCommit)
@@ -298,7 +305,7 @@ TEST_F(History, WaitsOnOverARestart)
 {
     start();
     set("/x", "trial");
-    ASSERT_EQ(ovctl({"commit", "--confirm", "6"}).exit_code, 0);
+    ASSERT_EQ(ovctl({"commit", "--confirm", "4"}).exit_code, 0);
     ASSERT_EQ(stop(SIGKILL), 128 + SIGKILL);
     start();
     EXPECT_EQ(value("/x"), "/x string trial\n");
@@ -313,8 +320,10 @@ TEST_F(History, UndoesAtTheStartWhatWasNotConfirmedInTime)
     ASSERT_EQ(ovctl({"commit", "--confirm", "60"}).exit_code, 0);
     set("/x", "2");
     ASSERT_EQ(ovctl({"commit", "--confirm", "2"}).exit_code, 0);
+    // What is kept of the deadline is a second of the clock.
+    const auto deadline = floor<seconds>(system_clock::now()) + 2s;
     ASSERT_EQ(stop(SIGKILL), 128 + SIGKILL);
-    std::this_thread::sleep_for(2500ms);
+    std::this_thread::sleep_until(deadline);
     start();
     const std::string text = log();
     EXPECT_LT(text.find("commits 2 to 3 were not confirmed in time"), text.find(": ready on "));
