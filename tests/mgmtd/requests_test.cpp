@@ -7,6 +7,8 @@
 #include <nlohmann/json.hpp>
 #include <unistd.h>
 
+#include <chrono>
+
 namespace
 {
 
@@ -46,6 +48,7 @@ class RequestsTest : public DaemonTest
         return ask(json{{"command", "get"}, {"name", name}, {"from", from}}.dump());
     }
 
+    const std::chrono::steady_clock::time_point began_ = std::chrono::steady_clock::now();
     Configuration configuration_{state_.path()};
     std::vector<PeerStatus> peers_;
     int events_announced_ = 0;
@@ -275,7 +278,9 @@ TEST_F(RequestsTest, StatusTellsOfTheDaemon)
     EXPECT_EQ(status["candidate_changes"], 1);
     EXPECT_EQ(status["peers"].dump(),
               R"([{"bytes_waiting":9,"events_sent":7,"name":"jsond","pid":42}])");
-    EXPECT_GE(status["uptime_seconds"].get<int>(), 0);
+    const auto uptime = std::chrono::seconds(status["uptime_seconds"].get<int>());
+    EXPECT_GE(uptime, std::chrono::seconds(0));
+    EXPECT_LE(uptime, std::chrono::steady_clock::now() - began_);
     EXPECT_TRUE(status["version"].is_string());
     EXPECT_EQ(status.size(), 8U);
 }
