@@ -44,7 +44,7 @@ int write_old(const md_dbinfo *info)
 std::vector<std::string> breaches_in(const LogCapture &log)
 {
     std::vector<std::string> texts;
-    for (const LogCapture::Line &line : log.lines) {
+    for (const ovhost::test::LoggedLine &line : log.lines) {
         if (line.unit == "commit" && line.level == ov_log_error) {
             EXPECT_EQ(line.flags, 2048U);
             texts.push_back(line.text);

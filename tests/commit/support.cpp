@@ -5,10 +5,6 @@
 
 #include <gtest/gtest.h>
 
-#include <cstdlib>
-#include <stdexcept>
-#include <system_error>
-
 namespace commit_test
 {
 
@@ -157,30 +153,6 @@ Config MemoryStore::config() const
         config.emplace(name, value.text);
     }
     return config;
-}
-
-LogCapture::LogCapture()
-    : previous_(ovhost::set_log_sink([this](const ovhost::LogRecord &record) {
-          lines.push_back(
-              {record.level, std::string(record.unit), record.flags, std::string(record.text)});
-      }))
-{
-}
-
-LogCapture::~LogCapture()
-{
-    ovhost::set_log_sink(std::move(previous_));
-}
-
-std::vector<std::string> LogCapture::texts(int level) const
-{
-    std::vector<std::string> found;
-    for (const Line &line : lines) {
-        if (line.level == level) {
-            found.push_back(line.text);
-        }
-    }
-    return found;
 }
 
 Bench::Bench(std::initializer_list<ovhost::Module *> modules)

@@ -5,11 +5,10 @@
 #include "host/commit/commit_store.h"
 #include "host/commit/engine.h"
 #include "host/commit/module.h"
-#include "host/framework/log_config.h"
 #include "host/framework/objects.h"
 #include "host/tree/tree.h"
+#include "tests/framework/log_capture.h"
 
-#include <filesystem>
 #include <functional>
 #include <map>
 #include <optional>
@@ -19,6 +18,8 @@
 
 namespace commit_test
 {
+
+using ovhost::test::LogCapture;
 
 /// A configuration: full names with their texts.
 using Config = std::map<std::string, std::string>;
@@ -88,31 +89,6 @@ class MemoryStore : public ovhost::CommitStore
     unsigned commits = 0;
     unsigned attempts = 0;
     std::vector<std::string> *calls = nullptr;
-};
-
-/// Collects log lines instead of writing them, for the length of its life.
-class LogCapture
-{
-  public:
-    struct Line {
-        int level;
-        std::string unit;
-        uint32 flags;
-        std::string text;
-    };
-
-    LogCapture();
-    LogCapture(const LogCapture &) = delete;
-    LogCapture &operator=(const LogCapture &) = delete;
-    ~LogCapture();
-
-    /// Texts of the lines of one level.
-    [[nodiscard]] std::vector<std::string> texts(int level) const;
-
-    std::vector<Line> lines;
-
-  private:
-    ovhost::LogSink previous_;
 };
 
 /// An engine over a store in memory. What it logs goes nowhere else.

@@ -43,6 +43,18 @@ class LogCapture
         ov_log_module_levels[ov_log_module_ovmd] = module_level_;
     }
 
+    /// Texts of the lines of one level.
+    [[nodiscard]] std::vector<std::string> texts(int level) const
+    {
+        std::vector<std::string> found;
+        for (const LoggedLine &line : lines) {
+            if (line.level == level) {
+                found.push_back(line.text);
+            }
+        }
+        return found;
+    }
+
     std::vector<LoggedLine> lines;
 
   private:
