@@ -59,12 +59,12 @@ void CommitEngine::add_module(Module &module)
         throw std::invalid_argument("there are two modules of the name " + registered.name);
     }
     for (const std::string &text : module.patterns()) {
-        std::optional<NamePattern> pattern = NamePattern::parse(text);
-        if (!pattern) {
+        std::optional<NodeScope> scope = NodeScope::parse(text);
+        if (!scope) {
             throw std::invalid_argument("module " + registered.name + " asks for \"" + text +
                                         "\", which is not a pattern of node names");
         }
-        registered.patterns.push_back(*std::move(pattern));
+        registered.scopes.push_back(*std::move(scope));
     }
     modules_.push_back(std::move(registered));
 }

@@ -45,8 +45,9 @@ class Module
     /// Short and unique: messages and log lines name the module with it.
     [[nodiscard]] virtual std::string name() const = 0;
 
-    /// Patterns over the names of the nodes whose changes concern the module. None: every change
-    /// does. Asked once, when the module is registered.
+    /// Patterns over the names of the nodes whose changes concern the module; one with "/**" behind
+    /// it stands for all nodes below. None: every change does. Asked once, when the module is
+    /// registered.
     [[nodiscard]] virtual std::vector<std::string> patterns() const { return {}; }
 
     /// Once before the first commit: takes up what is in force already. `running` is empty at the

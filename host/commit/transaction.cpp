@@ -11,9 +11,8 @@ namespace ovhost
 
 bool RegisteredModule::concerned_by(std::span<const std::string> node) const
 {
-    return patterns.empty() || std::ranges::any_of(patterns, [&](const NamePattern &pattern) {
-               return pattern.matches(node);
-           });
+    return scopes.empty() ||
+           std::ranges::any_of(scopes, [&](const NodeScope &scope) { return scope.holds(node); });
 }
 
 Transaction::Transaction(std::span<const RegisteredModule> modules, Tree running, Tree proposed)

@@ -5,9 +5,9 @@
 
 #include "host/commit/change_list.h"
 #include "host/commit/module.h"
+#include "host/commit/node_scope.h"
 #include "host/commit/report.h"
 #include "host/commit/supervisor.h"
-#include "host/tree/name.h"
 
 #include <set>
 #include <span>
@@ -21,7 +21,7 @@ namespace ovhost
 struct RegisteredModule {
     Module *module = nullptr;
     std::string name;
-    std::vector<NamePattern> patterns;
+    std::vector<NodeScope> scopes;
 
     /// Whether a change of this node concerns the module.
     [[nodiscard]] bool concerned_by(std::span<const std::string> node) const;

@@ -294,7 +294,7 @@ TEST(TransactionTest, NoNotifyMarkOfACheckReachesNotify)
 TEST(RegisteredModuleTest, PatternsSelectNodesAndNoneSelectsAll)
 {
     const ovhost::RegisteredModule some{
-        nullptr, "some", {*ovhost::NamePattern::parse("/a/*"), *ovhost::NamePattern::parse("/b")}};
+        nullptr, "some", {*ovhost::NodeScope::parse("/a/*"), *ovhost::NodeScope::parse("/b")}};
     const auto concerned = [](const ovhost::RegisteredModule &module, const std::string &name) {
         return module.concerned_by(commit_test::parts_of(name));
     };
