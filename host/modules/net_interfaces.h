@@ -1,7 +1,7 @@
 #pragma once
 // The module of the interfaces themselves: what they may be called, and that none goes while
-// something uses it. interface_nodes.h has the nodes, interface_users.h the users; interfaces.h has
-// what maps name interfaces by.
+// something uses it. interface_nodes.h has the nodes, interface_users.h the users;
+// map_interfaces.h has what maps name interfaces by.
 
 #include "host/commit/module.h"
 

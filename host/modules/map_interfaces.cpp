@@ -1,4 +1,4 @@
-#include "host/modules/interfaces.h"
+#include "host/modules/map_interfaces.h"
 
 #include "framework/appliance.h"
 #include "host/framework/match_string.h"
