@@ -27,10 +27,10 @@ int check_removal(const md_dbinfo *dbinfo, const std::string &application)
     if (err != 0 || rules_left > 0) {
         return err;
     }
-    char *message = nullptr;
-    err = md_find_appname_in_acl_or_xxxmap(application.c_str(), dbinfo->newdb, &message, nullptr);
-    const TextPtr owned(message);
-    return err == 0 && owned != nullptr ? refuse(dbinfo, owned.get()) : err;
+    OwnedText message;
+    err = md_find_appname_in_acl_or_xxxmap(application.c_str(), dbinfo->newdb, message.out(),
+                                           nullptr);
+    return err == 0 && message.get() != nullptr ? refuse(dbinfo, message.get()) : err;
 }
 
 } // namespace
@@ -50,8 +50,8 @@ int ApplicationsModule::check_change(md_dbinfo *dbinfo, mdb_db_change *change)
             return refuse(dbinfo, *fault);
         }
     }
-    const TstringPtr before = attribute_text(change->mdc_old_attribs);
-    return before != nullptr ? check_removal(dbinfo, ts_str(before.get())) : 0;
+    const std::optional<std::string> before = attribute_text(change->mdc_old_attribs);
+    return before ? check_removal(dbinfo, *before) : 0;
 }
 
 int ApplicationsModule::check_commit(md_dbinfo *dbinfo, const mdb_db_change_array *)

@@ -8,20 +8,25 @@ namespace ovhost
 namespace
 {
 
+const char *or_null(const std::optional<std::string> &text)
+{
+    return text ? text->c_str() : nullptr;
+}
+
 void announce(const mdb_db_change &change)
 {
     const char *const name = ts_str(change.mdc_name);
-    const TstringPtr before = attribute_text(change.mdc_old_attribs);
-    const TstringPtr after = attribute_text(change.mdc_new_attribs);
+    const std::optional<std::string> before = attribute_text(change.mdc_old_attribs);
+    const std::optional<std::string> after = attribute_text(change.mdc_new_attribs);
     switch (change.mdc_change_type) {
     case mdct_add:
-        md_send_dbc_event2("add", name, ts_str(after.get()), nullptr);
+        md_send_dbc_event2("add", name, or_null(after), nullptr);
         break;
     case mdct_delete:
-        md_send_dbc_event2("delete", name, nullptr, ts_str(before.get()));
+        md_send_dbc_event2("delete", name, nullptr, or_null(before));
         break;
     default:
-        md_send_dbc_event(name, ts_str(after.get()), ts_str(before.get()));
+        md_send_dbc_event(name, or_null(after), or_null(before));
     }
 }
 

@@ -36,8 +36,7 @@ bool is_deleted(const mdb_db_change *change)
 
 std::optional<std::string> new_text(const mdb_db_change *change)
 {
-    const TstringPtr text = attribute_text(change->mdc_new_attribs);
-    return text ? std::optional<std::string>(ts_str(text.get())) : std::nullopt;
+    return attribute_text(change->mdc_new_attribs);
 }
 
 std::vector<std::string> patterns_below(const std::string &root, unsigned levels)

@@ -13,10 +13,9 @@ namespace
 
 std::vector<std::string> vlan_names(const mdb_db *db)
 {
-    tstr_array *array = nullptr;
-    require(md_get_vlan_interfaces(db, &array), "list the VLAN interfaces");
-    const TstrArrayPtr owned(array);
-    return texts_of(owned.get());
+    OwnedStrings names;
+    require(md_get_vlan_interfaces(db, names.out()), "list the VLAN interfaces");
+    return texts_of(names.get());
 }
 
 std::optional<bool> enable_flag(const mdb_db *db, const std::string &name)

@@ -40,10 +40,10 @@ std::vector<std::string> router_nodes(const mdb_db *db, const std::string &name)
 
 std::vector<std::string> use_nodes(const mdb_db *db, std::string name)
 {
-    tstr_array *array = nullptr;
-    require(md_interface_usage_check(db, name.data(), &array), "look for who uses an interface");
-    const TstrArrayPtr owned(array);
-    std::vector<std::string> nodes = texts_of(owned.get());
+    OwnedStrings found;
+    require(md_interface_usage_check(db, name.data(), found.out()),
+            "look for who uses an interface");
+    std::vector<std::string> nodes = texts_of(found.get());
     std::ranges::copy(router_nodes(db, name), std::back_inserter(nodes));
     return nodes;
 }
@@ -54,10 +54,11 @@ std::vector<InterfaceUse> interface_uses(const mdb_db *db, const std::string &na
 {
     std::vector<InterfaceUse> uses;
     for (const std::string &node : use_nodes(db, name)) {
-        tstring *text = nullptr;
-        require(md_interface_usage_to_usertext(node.c_str(), &text), "name who uses an interface");
-        if (const TstringPtr owned(text); owned) {
-            uses.push_back({node, ts_str(owned.get())});
+        OwnedString text;
+        require(md_interface_usage_to_usertext(node.c_str(), text.out()),
+                "name who uses an interface");
+        if (text.get() != nullptr) {
+            uses.push_back({node, ts_str(text.get())});
         }
     }
     return uses;

@@ -84,10 +84,9 @@ std::optional<std::string> unknown_field(const mdb_db &db, const LegacyEntry &en
 /// A mask or its length as a length; nothing when the text is neither.
 std::optional<std::string> mask_length(const std::string &text)
 {
-    char *length = nullptr;
-    const int err = lc_mask_or_masklen_to_masklen_str(text.c_str(), &length);
-    const TextPtr owned(length);
-    return err == 0 ? std::optional<std::string>(length) : std::nullopt;
+    OwnedText length;
+    const int err = lc_mask_or_masklen_to_masklen_str(text.c_str(), length.out());
+    return err == 0 ? std::optional<std::string>(length.get()) : std::nullopt;
 }
 
 /// What is wrong with the mask of an entry's IPv4 addresses, if that is what is wrong.

@@ -12,10 +12,9 @@ namespace
 std::optional<std::string> ask_text(int (*getter)(const mdb_db *, char **), const mdb_db *db,
                                     const char *what)
 {
-    char *text = nullptr;
-    require(getter(db, &text), "read the", what);
-    const TextPtr owned(text);
-    return text != nullptr ? std::optional<std::string>(text) : std::nullopt;
+    OwnedText text;
+    require(getter(db, text.out()), "read the", what);
+    return text.get() != nullptr ? std::optional<std::string>(text.get()) : std::nullopt;
 }
 
 } // namespace

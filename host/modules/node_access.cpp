@@ -8,6 +8,15 @@
 
 namespace ovhost
 {
+namespace
+{
+
+std::optional<std::string> copied(const OwnedString &text)
+{
+    return text.get() != nullptr ? std::optional<std::string>(ts_str(text.get())) : std::nullopt;
+}
+
+} // namespace
 
 void require(int err, std::string_view deed, std::string_view object)
 {
@@ -17,45 +26,37 @@ void require(int err, std::string_view deed, std::string_view object)
     }
 }
 
-TstringPtr attribute_text(const bn_attrib_array *attribs)
+std::optional<std::string> attribute_text(const bn_attrib_array *attribs)
 {
-    tstring *text = nullptr;
-    require(bn_attrib_array_get_attrib_tstr(attribs, ba_value, &text), "read a change's value");
-    return TstringPtr(text);
-}
-
-BindingPtr node_binding(const mdb_db *db, const std::string &name)
-{
-    bn_binding *binding = nullptr;
-    require(mdb_get_node_binding(nullptr, db, name.c_str(), 0, &binding), "read", name);
-    return BindingPtr(binding);
+    OwnedString text;
+    require(bn_attrib_array_get_attrib_tstr(attribs, ba_value, text.out()),
+            "read a change's value");
+    return copied(text);
 }
 
 std::optional<std::string> node_text(const mdb_db *db, const std::string &name)
 {
-    tstring *text = nullptr;
-    require(mdb_get_node_value_tstr(nullptr, db, name.c_str(), 0, nullptr, &text), "read", name);
-    const TstringPtr owned(text);
-    return owned ? std::optional<std::string>(ts_str(owned.get())) : std::nullopt;
+    OwnedString text;
+    require(mdb_get_node_value_tstr(nullptr, db, name.c_str(), 0, nullptr, text.out()), "read",
+            name);
+    return copied(text);
 }
 
 std::vector<std::string> child_names(const mdb_db *db, const std::string &parent)
 {
-    tstr_array *array = nullptr;
-    require(mdb_get_tstr_array(nullptr, db, parent.c_str(), 0, 0, 0, &array), "list the nodes of",
-            parent);
-    const TstrArrayPtr owned(array);
-    return texts_of(owned.get());
+    OwnedStrings names;
+    require(mdb_get_tstr_array(nullptr, db, parent.c_str(), 0, 0, 0, names.out()),
+            "list the nodes of", parent);
+    return texts_of(names.get());
 }
 
 std::vector<std::string> matching_nodes(const mdb_db *db, const std::string &pattern)
 {
-    tstr_array *array = nullptr;
-    require(
-        mdb_get_matching_tstr_array(nullptr, db, pattern.c_str(), mdqf_sel_class_no_state, &array),
-        "look for", pattern);
-    const TstrArrayPtr owned(array);
-    return texts_of(owned.get());
+    OwnedStrings names;
+    require(mdb_get_matching_tstr_array(nullptr, db, pattern.c_str(), mdqf_sel_class_no_state,
+                                        names.out()),
+            "look for", pattern);
+    return texts_of(names.get());
 }
 
 std::vector<std::string> texts_of(const tstr_array *array)
@@ -84,13 +85,11 @@ std::optional<uint32> parse_number(std::string_view text)
                                                                     : std::nullopt;
 }
 
-TstringPtr make_tstring(const std::string &text)
+TstringCopy::TstringCopy(const std::string &text)
 {
-    tstring *made = nullptr;
-    if (ts_new_str(&made, text.c_str()) != 0) {
+    if (ts_new_str(copy_.out(), text.c_str()) != 0) {
         throw std::bad_alloc();
     }
-    return TstringPtr(made);
 }
 
 std::string type_name(bn_type type)

@@ -1,15 +1,13 @@
 #pragma once
-// What modules need of nodes: the operations of framework/ with owners around what they hand out,
-// and exceptions for what fails. To a check, a node that cannot be read is not one that is absent:
-// "nobody uses it" would be the answer of a guard that could not look.
+// What modules need of nodes: the operations of framework/ with C++'s own types for what they hand
+// out, and exceptions for what fails. To a check, a node that cannot be read is not one that is
+// absent: "nobody uses it" would be the answer of a guard that could not look.
 //
 // commit_access.h has what checks need besides.
 
 #include "framework/mdb_db.h"
-#include "framework/typed_arrays.h"
+#include "host/framework/owners.h"
 
-#include <cstdlib>
-#include <memory>
 #include <optional>
 #include <string>
 #include <string_view>
@@ -18,41 +16,13 @@
 namespace ovhost
 {
 
-struct TstringDeleter {
-    void operator()(tstring *text) const { ts_free(&text); }
-};
-using TstringPtr = std::unique_ptr<tstring, TstringDeleter>;
-
-struct TstrArrayDeleter {
-    void operator()(tstr_array *texts) const { tstr_array_free(&texts); }
-};
-using TstrArrayPtr = std::unique_ptr<tstr_array, TstrArrayDeleter>;
-
-struct Uint32ArrayDeleter {
-    void operator()(uint32_array *numbers) const { uint32_array_free(&numbers); }
-};
-using Uint32ArrayPtr = std::unique_ptr<uint32_array, Uint32ArrayDeleter>;
-
-struct BindingDeleter {
-    void operator()(bn_binding *binding) const { bn_binding_free(&binding); }
-};
-using BindingPtr = std::unique_ptr<bn_binding, BindingDeleter>;
-
-struct TextDeleter {
-    void operator()(char *text) const { std::free(text); }
-};
-using TextPtr = std::unique_ptr<char, TextDeleter>;
-
 /// Throws std::runtime_error, "cannot DEED: error code N" or "cannot DEED OBJECT: error code N",
 /// for every code but 0. Every function below that asks the database throws it with the node's
 /// name.
 void require(int err, std::string_view deed, std::string_view object = {});
 
-/// The value among a change's attributes; null when there is none.
-[[nodiscard]] TstringPtr attribute_text(const bn_attrib_array *attribs);
-
-/// A node; null when it is absent.
-[[nodiscard]] BindingPtr node_binding(const mdb_db *db, const std::string &name);
+/// The value among a change's attributes; nothing when there is none.
+[[nodiscard]] std::optional<std::string> attribute_text(const bn_attrib_array *attribs);
 
 /// The value of a node as text; nothing when it is absent.
 [[nodiscard]] std::optional<std::string> node_text(const mdb_db *db, const std::string &name);
@@ -72,8 +42,17 @@ void require(int err, std::string_view deed, std::string_view object = {});
 /// A decimal number; nothing when the text is none or it is too large.
 [[nodiscard]] std::optional<uint32> parse_number(std::string_view text);
 
-/// A copy as the library takes it. Throws std::bad_alloc.
-[[nodiscard]] TstringPtr make_tstring(const std::string &text);
+/// A copy of a text as the library takes it. Throws std::bad_alloc.
+class TstringCopy
+{
+  public:
+    explicit TstringCopy(const std::string &text);
+
+    [[nodiscard]] tstring *get() const { return copy_.get(); }
+
+  private:
+    OwnedString copy_;
+};
 
 /// The name of a type ("uint32"); its number when it has none.
 [[nodiscard]] std::string type_name(bn_type type);

@@ -146,15 +146,16 @@ int SchemaModule::check_change(md_dbinfo *dbinfo, mdb_db_change *change)
     if (rule == nullptr || is_deleted(change)) {
         return 0;
     }
-    BindingPtr binding = node_binding(dbinfo->newdb, ts_str(change->mdc_name));
-    char *text = nullptr;
-    const int err = bn_binding_get_str(binding.get(), ba_value, rule->type, 0, &text);
-    const TextPtr owned_text(text);
+    const char *const node = ts_str(change->mdc_name);
+    OwnedBinding binding;
+    require(mdb_get_node_binding(nullptr, dbinfo->newdb, node, 0, binding.out()), "read", node);
+    OwnedText text;
+    const int err = bn_binding_get_str(binding.get(), ba_value, rule->type, 0, text.out());
     if (err == lc_err_bad_type) {
         return refuse(dbinfo, "must be of type " + type_name(rule->type));
     }
-    if (err == 0 && !is_choice(*rule, text)) {
-        return refuse(dbinfo, "must be " + choices(*rule) + ", not \"" + text + "\"");
+    if (err == 0 && !is_choice(*rule, text.get())) {
+        return refuse(dbinfo, "must be " + choices(*rule) + ", not \"" + text.get() + "\"");
     }
     return err;
 }

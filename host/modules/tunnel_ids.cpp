@@ -109,19 +109,18 @@ Fault give_ids(const md_dbinfo *dbinfo, const IdNeeds &needs, const HeldIds &hel
     for (const auto &claim : needs.claimed) {
         wanted += md_tunbin_ht_id_has_tunnel(claim.first) ? 0 : 1;
     }
-    uint32_array *array = nullptr;
-    if (uint32_array_new_full(&array, nullptr) != 0) {
+    OwnedIntegers offered;
+    if (uint32_array_new_full(offered.out(), nullptr) != 0) {
         throw std::bad_alloc();
     }
-    const Uint32ArrayPtr offered(array);
-    const int err = md_get_next_n_available_tunnel_ids(wanted, array);
-    const auto count = static_cast<uint32>(uint32_array_length_quick(array));
+    const int err = md_get_next_n_available_tunnel_ids(wanted, offered.get());
+    const auto count = static_cast<uint32>(uint32_array_length_quick(offered.get()));
     if (err != 0) {
         return describe_want(wanted, count, needs, held);
     }
     auto name = needs.without_id.begin();
     for (uint32 i = 0; i < count && name != needs.without_id.end(); ++i) {
-        const uint32 id = uint32_array_get_quick(array, i);
+        const uint32 id = uint32_array_get_quick(offered.get(), i);
         if (!needs.claimed.contains(id)) {
             write_id(dbinfo, *name++, id);
         }

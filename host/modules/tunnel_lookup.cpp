@@ -57,7 +57,7 @@ std::vector<TunnelFacts> list_tunnels(const mdb_db *db)
         int err = md_get_tunnel_name_str_sorted(position, &name);
         uint32 id = TUNNEL_ID_NONE;
         if (err == 0) {
-            err = name != nullptr ? md_get_tunnel_id_sorted(make_tstring(name).get(), &id)
+            err = name != nullptr ? md_get_tunnel_id_sorted(TstringCopy(name).get(), &id)
                                   : lc_err_unexpected_null;
         }
         require(err, "list tunnel", std::to_string(position) + " of " + std::to_string(count));

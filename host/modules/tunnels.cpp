@@ -72,7 +72,7 @@ class Outcome
 
 int bind_id(const Tunnel &tunnel)
 {
-    return md_set_tunnel_id(tunnel.id.value_or(TUNNEL_ID_NONE), make_tstring(tunnel.name).get());
+    return md_set_tunnel_id(tunnel.id.value_or(TUNNEL_ID_NONE), TstringCopy(tunnel.name).get());
 }
 
 int cache(const Tunnel &tunnel)
@@ -197,8 +197,8 @@ int TunnelsModule::apply(const md_dbinfo *dbinfo, const mdb_db_change_array *cha
     const std::set<std::string> ambiguous = forget(tunnels, outcome);
     for (const TunnelChange &change : tunnels) {
         if (change.before && !change.after && !handed_on.contains(change.before->id)) {
-            outcome.add(md_free_tunnel_id(make_tstring(change.before->name).get()),
-                        "free the ID of", *change.before);
+            outcome.add(md_free_tunnel_id(TstringCopy(change.before->name).get()), "free the ID of",
+                        *change.before);
             held_.freed(change.before->id.value_or(TUNNEL_ID_NONE), present_ms());
         }
     }

@@ -56,7 +56,7 @@ std::vector<std::string> TunnelTest::bound()
         const char *name = nullptr;
         uint32 id = 0;
         EXPECT_EQ(md_get_tunnel_name_str_sorted(position, &name), 0);
-        EXPECT_EQ(md_get_tunnel_id_sorted(make_tstring(name).get(), &id), 0);
+        EXPECT_EQ(md_get_tunnel_id_sorted(TstringCopy(name).get(), &id), 0);
         tunnels.push_back(std::string(name) + " " + std::to_string(id));
     }
     return tunnels;

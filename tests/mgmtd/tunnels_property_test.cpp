@@ -175,7 +175,7 @@ class RandomTunnels : public TunnelTest
             ASSERT_EQ(stored(name),
                       "uint16 " + std::to_string(expected.id) + ", string " + expected.alias);
             uint32 id = none;
-            ASSERT_EQ(md_get_tunnel_id(make_tstring(name).get(), &id), 0) << name;
+            ASSERT_EQ(md_get_tunnel_id(TstringCopy(name).get(), &id), 0) << name;
             ASSERT_EQ(id, expected.id) << name;
             ASSERT_EQ(md_tunbin_ht_get_id_by_name(name.c_str()), expected.id) << name;
             ASSERT_STREQ(md_tunbin_ht_get_name_by_id(expected.id), name.c_str());
