@@ -11,6 +11,10 @@ if(OVMD_SANITIZE)
     -fno-sanitize-recover=all -fno-omit-frame-pointer)
   target_link_options(ovmd_build_flags INTERFACE -fsanitize=${OVMD_SANITIZE})
 endif()
+if(OVMD_BUILD_FUZZ)
+  # The engine is told which paths a run took, of the library and of the host alike.
+  target_compile_options(ovmd_build_flags INTERFACE -fsanitize=fuzzer-no-link)
+endif()
 
 # Adds a library of the reference host: ovmd_host_library(<target> <source>...).
 function(ovmd_host_library target)

@@ -1,0 +1,40 @@
+#pragma once
+// What the fuzzers share: the reference host's operations, silent and on a database of each run's
+// own, and a way to fail that the fuzzing engine takes for a finding.
+
+#include "host/framework/objects.h"
+
+#include <cstdint>
+#include <string>
+
+namespace ovfuzz
+{
+
+/// Ends the process when a promise is broken: the engine then keeps the input.
+void require(bool holds, const char *promise);
+
+/// From here on every line is printed and then dropped, so that formats are tried too.
+void silence_log();
+
+/// Gives the process fixed directories of its own, under the directory for temporary files, where
+/// they stay when it ends. To be called before the first run.
+void enter_scratch_root();
+
+/// A commit that counts refusals.
+struct Commit : md_commit {
+    int refuse(int code, std::string message) override;
+
+    int num_refusals = 0;
+};
+
+/// Sets a node whose name has no escaped components.
+void set(mdb_db &db, const std::string &node, const std::string &value);
+
+/// A node's text; null when it has none.
+const std::string *text_of(const mdb_db &db, const std::string &node);
+
+} // namespace ovfuzz
+
+/// The engine's entry points: it declares them nowhere.
+extern "C" int LLVMFuzzerInitialize(int *argc, char ***argv);
+extern "C" int LLVMFuzzerTestOneInput(const std::uint8_t *data, std::size_t size);
