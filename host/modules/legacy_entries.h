@@ -1,6 +1,7 @@
 #pragma once
 // The entries of maps in a legacy configuration, which have one node for each field that they
-// match, and what keeps one from being converted as it is. legacy_upgrade.h has them converted.
+// match, and what they say in the words of match strings. legacy_faults.h judges them,
+// legacy_upgrade.h has them converted.
 //
 // Fields, below an entry's match node, and the keys that they have in a match string:
 //
@@ -39,22 +40,25 @@ struct LegacyEntry {
 
 [[nodiscard]] bool matches_by_acl(const mdb_db &db, const LegacyEntry &entry);
 
-/// Why an entry must not be handed to the library, which would make less of it and say nothing.
-[[nodiscard]] std::optional<std::string> fault_before_conversion(const mdb_db &legacy,
-                                                                 const LegacyEntry &entry);
+/// The text of a field; empty when the entry has none such.
+[[nodiscard]] std::string legacy_text(const mdb_db &db, const LegacyEntry &entry,
+                                      const char *field);
 
-/// Whether the library has come to the entry.
-[[nodiscard]] bool is_converted(const mdb_db &converted, const LegacyEntry &entry);
+/// A field of an entry that would be passed over; nothing when there is none.
+[[nodiscard]] std::optional<std::string> unknown_legacy_field(const mdb_db &db,
+                                                              const LegacyEntry &entry);
 
-/// What the library has dropped of an entry that it has converted: an entry that says less matches
-/// more.
-[[nodiscard]] std::optional<std::string> loss_fault(const mdb_db &legacy, const mdb_db &converted,
-                                                    const LegacyEntry &entry);
+/// What is wrong with the mask of an entry's IPv4 addresses, if that is what is wrong.
+[[nodiscard]] std::optional<std::string> mask_fault(const mdb_db &legacy, const LegacyEntry &entry);
 
-/// Of an entry that has not been converted; `err` ended the conversion.
-[[nodiscard]] std::string failure_message(const mdb_db &legacy, const LegacyEntry &entry, int err);
+struct LegacyPair {
+    std::string key;
+    std::string text; ///< as it stands in a match string
+};
 
-/// The same when there is no entry to name.
-[[nodiscard]] std::string failure_message(int err);
+/// All pairs that the match string of an entry must have for the entry to match no more than it
+/// does. Both ends of a family are among them, though they be for any address: without them
+/// the entry would match the other family, too.
+[[nodiscard]] std::vector<LegacyPair> legacy_pairs(const mdb_db &legacy, const LegacyEntry &entry);
 
 } // namespace ovhost

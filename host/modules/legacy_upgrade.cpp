@@ -1,7 +1,7 @@
 #include "host/modules/legacy_upgrade.h"
 
 #include "host/framework/objects.h"
-#include "host/modules/legacy_entries.h"
+#include "host/modules/legacy_faults.h"
 #include "host/tree/diff.h"
 #include "host/tree/name.h"
 #include "orvale/md_xmap_common.h"
