@@ -47,17 +47,17 @@ class Peer : public PeerTest
 class PeerOfLargeCommit : public PeerTest
 {
   protected:
-    PeerOfLargeCommit() { start_quietly("warning", {"--peer-buffer", "8"}); }
+    PeerOfLargeCommit() { start_quietly("warning", {"--peer-buffer", "2"}); }
 
-    /// Commits 20,000 new nodes, /x/1 and so on, whose events make more than may wait for a peer.
+    /// Commits 5,000 new nodes, /x/1 and so on, whose events make more than may wait for a peer.
     void commit_many() const
     {
         std::string text;
-        for (unsigned i = 1; i <= 20000; ++i) {
+        for (unsigned i = 1; i <= 5000; ++i) {
             text += "/x/" + std::to_string(i) + ",string," + value_of(i) + "\n";
         }
         ASSERT_EQ(ovctl({"load", "-"}, text).exit_code, 0);
-        ASSERT_EQ(ovctl({"commit"}), done("commit 2: 20000 changes\n"));
+        ASSERT_EQ(ovctl({"commit"}), done("commit 2: 5000 changes\n"));
     }
 
     static std::string value_of(unsigned i) { return std::string(200, 'v') + std::to_string(i); }
@@ -170,7 +170,7 @@ TEST_F(PeerOfLargeCommit, DoesNotHoldItUpWhenItSleeps)
     auto jsond = start_jsond({"--retry"});
     jsond->signal(SIGSTOP);
     commit_many();
-    EXPECT_THAT(ovctl({"get", "/x/20000"}).out, HasSubstr("/x/20000 string vvv"));
+    EXPECT_THAT(ovctl({"get", "/x/5000"}).out, HasSubstr("/x/5000 string vvv"));
     // More than may wait for it: it was let go, and comes back when it wakes.
     EXPECT_FALSE(is_registered());
     EXPECT_THAT(log(), HasSubstr("peer jsond) was disconnected: does not read: "));
@@ -189,7 +189,7 @@ TEST_F(PeerOfLargeCommit, LosesNothingWhenItReads)
     auto jsond = start_jsond();
     commit_many();
     std::string expected;
-    for (unsigned i = 1; i <= 20000; ++i) {
+    for (unsigned i = 1; i <= 5000; ++i) {
         const std::string name = "/x/" + std::to_string(i);
         expected += event_line("add", name, value_of(i).c_str(), nullptr) + "\n";
     }
