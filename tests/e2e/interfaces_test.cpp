@@ -143,8 +143,9 @@ TEST_F(Interfaces, TakeTheRoutesBehindTheirAddressWithThem)
     EXPECT_EQ(ovctl({"commit"}), done("commit 3: 4 changes\n"));
     EXPECT_EQ(ovctl({"get", prefixes, "--subtree"}),
               done(prefixes + "/30.0.0.0\\/8/nhop/198.51.100.9 ipv4addr 198.51.100.9\n"));
-    EXPECT_THAT(log_lines(log()), Contains("notice interfaces -: the address 192.0.2.1/24 is gone, "
-                                           "and 2 next hops behind it"));
+    EXPECT_THAT(log_lines(log()),
+                Contains("notice interface-address -: the address 192.0.2.1/24 is gone, "
+                         "and 2 next hops behind it"));
 }
 
 TEST_F(Interfaces, AreEnabledAndDisabled)
