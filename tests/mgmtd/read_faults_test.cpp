@@ -143,6 +143,24 @@ TEST_F(ReadFaults, RefuseWhatWouldBeAllowed)
               "committed");
 }
 
+TEST_F(ReadFaults, NameTheNodeAndTheCode)
+{
+    reads = 0;
+    failing_read = 1;
+    try {
+        (void)list_acls(configuration_->running_db());
+        FAIL();
+    } catch (const std::runtime_error &error) {
+        EXPECT_STREQ(error.what(),
+                     "cannot list the nodes of /ov/tunneld/acl/config: error code 14000");
+    }
+    reads = 0;
+    set(acl("new"), "new");
+    const std::string refusal = commit_in_vain();
+    EXPECT_EQ(refusal,
+              acl("new") + ": cannot read " + acl("new") + ": error code 14000 (schema)\n");
+}
+
 // Whoever asks gets an error, and not half the answer.
 TEST_F(ReadFaults, FailQuestions)
 {
