@@ -12,12 +12,10 @@
 namespace ovfuzz
 {
 
-void require(bool holds, const char *promise)
+void report_broken(const char *promise)
 {
-    if (!holds) {
-        (void)std::fprintf(stderr, "Broken promise: %s\n", promise);
-        std::abort();
-    }
+    (void)std::fprintf(stderr, "Broken promise: %s\n", promise);
+    std::abort();
 }
 
 void silence_log()

@@ -10,8 +10,15 @@
 namespace ovfuzz
 {
 
-/// Ends the process when a promise is broken: the engine then keeps the input.
-void require(bool holds, const char *promise);
+/// Ends the process: the engine then keeps the input.
+[[noreturn]] void report_broken(const char *promise);
+
+inline void require(bool holds, const char *promise)
+{
+    if (!holds) {
+        report_broken(promise);
+    }
+}
 
 /// From here on every line is printed and then dropped, so that formats are tried too.
 void silence_log();

@@ -17,7 +17,7 @@ constexpr std::chrono::milliseconds moment(500);
 
 } // namespace
 
-ProgressLine::ProgressLine(std::ostream &stream, std::string what, Clock::time_point now)
+ProgressLine::ProgressLine(std::ostream &stream, std::string_view what, Clock::time_point now)
     : stream_(stream), what_(printable(what)), began_(now)
 {
 }

@@ -6,6 +6,7 @@
 #include <chrono>
 #include <iosfwd>
 #include <string>
+#include <string_view>
 
 namespace ovhost
 {
@@ -17,7 +18,7 @@ class ProgressLine
 
     /// `what` is sent, by its name for people. Nothing is printed where `stream` is no terminal
     /// (terminal.h), and nothing before the request has taken a moment.
-    ProgressLine(std::ostream &stream, std::string what, Clock::time_point now = Clock::now());
+    ProgressLine(std::ostream &stream, std::string_view what, Clock::time_point now = Clock::now());
 
     /// Takes the line away.
     ~ProgressLine();
