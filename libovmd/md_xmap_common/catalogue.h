@@ -78,7 +78,7 @@ inline constexpr map_type map_types[] = {
 #undef OVMD_SEC_MAP
 #undef OVMD_REGULAR_MAP_TYPE
 
-constexpr bool is_same_text(const char *left, const char *right)
+consteval bool is_same_text(const char *left, const char *right)
 {
     while (*left != '\0' && *left == *right) {
         ++left;
@@ -88,13 +88,13 @@ constexpr bool is_same_text(const char *left, const char *right)
 }
 
 // A second row of a kind would never be found; kinds of one key would share their references.
-constexpr bool are_distinct(const map_type &left, const map_type &right)
+consteval bool are_distinct(const map_type &left, const map_type &right)
 {
     return left.mtype != right.mtype && !is_same_text(left.root, right.root) &&
            (left.key == nullptr || right.key == nullptr || !is_same_text(left.key, right.key));
 }
 
-constexpr bool all_distinct()
+consteval bool all_distinct()
 {
     for (const map_type &row : map_types) {
         for (const map_type &other : map_types) {
