@@ -47,7 +47,7 @@ class type_memo
     {
         const auto first = static_cast<unsigned char>(name.text[0]);
         const auto last = static_cast<unsigned char>(name.text[name.length - 1]);
-        return (name.length * 5 + first * 7u + last) % num_slots;
+        return (name.length * 5 + size_t{first} * 7 + last) % num_slots;
     }
 
     slot slots_[num_slots];
