@@ -12,7 +12,6 @@
 #include "host/modules/map_interfaces.h"
 #include "host/modules/maps.h"
 #include "host/modules/model.h"
-#include "host/modules/name_depth.h"
 #include "host/modules/net_interfaces.h"
 #include "host/modules/routes.h"
 #include "host/modules/schema.h"
@@ -25,7 +24,6 @@ namespace ovhost
 
 struct ModuleSet::Modules {
     SchemaModule schema;
-    NameDepthModule name_depth;
     ModelModule model;
     TunnelsModule tunnels;
     AclsModule acls;
@@ -52,7 +50,6 @@ void ModuleSet::add_to(CommitEngine &engine)
 {
     // Order counts: checks refuse before anything follows, and events tell of what is done.
     engine.add_module(modules_->schema);
-    engine.add_module(modules_->name_depth);
     engine.add_module(modules_->model);
     engine.add_module(modules_->tunnels);
     // Maps look for the ACLs that they name.

@@ -19,10 +19,6 @@ namespace ovhost
 
 inline constexpr const char *acls_node = "/ov/tunneld/acl/config";
 
-/// How many parts a name below it may have: as many as an ACL's fields and records have, and some
-/// more, for parts that come later.
-inline constexpr unsigned levels_of_an_acl = 8;
-
 /// The component with an ACL's name, counted from 0.
 inline constexpr std::size_t acl_name_part = 4;
 

@@ -151,7 +151,7 @@ int check_reference(const md_dbinfo *dbinfo, const mdb_db_change *change, const 
 
 std::vector<std::string> AclsModule::patterns() const
 {
-    return patterns_below(acls_node, levels_of_an_acl);
+    return {std::string(acls_node) + "/**"};
 }
 
 int AclsModule::check_change(md_dbinfo *dbinfo, mdb_db_change *change)

@@ -13,7 +13,6 @@ namespace
 
 constexpr const char *rules_node = "/ov/tunneld/app/config";
 constexpr const char *name_pattern = "/ov/tunneld/app/config/*/name";
-constexpr unsigned levels_of_a_rule = 4;
 
 /// Refuses that an application goes while it is used. Both sides of that are of the proposed
 /// database, so that an application may go together with what uses it.
@@ -37,7 +36,7 @@ int check_removal(const md_dbinfo *dbinfo, const std::string &application)
 
 std::vector<std::string> ApplicationsModule::patterns() const
 {
-    return patterns_below(rules_node, levels_of_a_rule);
+    return {std::string(rules_node) + "/**"};
 }
 
 int ApplicationsModule::check_change(md_dbinfo *dbinfo, mdb_db_change *change)

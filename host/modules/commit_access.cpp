@@ -39,17 +39,6 @@ std::optional<std::string> new_text(const mdb_db_change *change)
     return attribute_text(change->mdc_new_attribs);
 }
 
-std::vector<std::string> patterns_below(const std::string &root, unsigned levels)
-{
-    std::vector<std::string> patterns;
-    std::string pattern = root;
-    for (unsigned level = 0; level < levels; ++level) {
-        pattern += "/*";
-        patterns.push_back(pattern);
-    }
-    return patterns;
-}
-
 std::optional<std::string> own_name_fault(const char *thing, const std::string &name,
                                           const mdb_db_change *change)
 {

@@ -21,9 +21,6 @@ namespace ovhost
 /// The changed node's new value as text; nothing for a deleted node.
 [[nodiscard]] std::optional<std::string> new_text(const mdb_db_change *change);
 
-/// ROOT/*, ROOT/*/* and so on: everything below a root, down to so many levels.
-[[nodiscard]] std::vector<std::string> patterns_below(const std::string &root, unsigned levels);
-
 /// What is wrong with a node that must hold its own name; `thing` says what that is.
 [[nodiscard]] std::optional<std::string> own_name_fault(const char *thing, const std::string &name,
                                                         const mdb_db_change *change);

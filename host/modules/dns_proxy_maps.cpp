@@ -79,7 +79,7 @@ std::string dns_proxy_maps_node(const std::string &vrf)
 
 std::vector<std::string> DnsProxyMapsModule::patterns() const
 {
-    return patterns_below(dns_proxy_maps_node("*"), levels_of_a_map);
+    return {dns_proxy_maps_node("*") + "/**"};
 }
 
 int DnsProxyMapsModule::check_change(md_dbinfo *dbinfo, mdb_db_change *change)

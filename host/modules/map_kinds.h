@@ -54,10 +54,6 @@ inline constexpr std::array<MapKind, 6> map_kinds{{
      "/ov/tunneld/sec_map/config/map/*", 6, "match"},
 }};
 
-/// How many parts a name below a kind's root may have: an entry's older form has
-/// "MAP/prio/10/match/0/source/addr/ipv4/static/mask_len".
-inline constexpr unsigned levels_of_a_map = 12;
-
 /// The entry of every map for what no other entry matches. No reference is kept of the ACL that it
 /// names.
 inline constexpr const char *default_priority = "65535";

@@ -34,7 +34,7 @@ void follow_lost_acl(const MapKind &kind, const md_dbinfo *dbinfo, const mdb_db_
 
 std::vector<std::string> MapsModule::patterns() const
 {
-    return patterns_below(kind_.root_pattern, levels_of_a_map);
+    return {std::string(kind_.root_pattern) + "/**"};
 }
 
 int MapsModule::check_change(md_dbinfo *dbinfo, mdb_db_change *change)

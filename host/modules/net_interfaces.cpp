@@ -5,17 +5,10 @@
 #include "host/modules/interface_users.h"
 #include "host/modules/node_access.h"
 
-#include <algorithm>
-#include <iterator>
-
 namespace ovhost
 {
 namespace
 {
-
-/// Deep enough for what stands below a record, "addr/ipv4/static/1/mask_len".
-constexpr unsigned levels_of_a_record = 6;
-constexpr unsigned levels_of_a_tunneld_interface = 4;
 
 constexpr std::size_t record_name_part = 3;
 constexpr std::size_t tunneld_kind_part = 5;
@@ -81,10 +74,7 @@ int check_deletion(md_dbinfo *dbinfo, const InterfaceChange &changed)
 
 std::vector<std::string> NetInterfacesModule::patterns() const
 {
-    std::vector<std::string> patterns = patterns_below(interface_records_node, levels_of_a_record);
-    std::ranges::copy(patterns_below(tunneld_interfaces_node("*"), levels_of_a_tunneld_interface),
-                      std::back_inserter(patterns));
-    return patterns;
+    return {std::string(interface_records_node) + "/**", tunneld_interfaces_node("*") + "/**"};
 }
 
 int NetInterfacesModule::check_change(md_dbinfo *dbinfo, mdb_db_change *change)

@@ -21,8 +21,6 @@ constexpr const char *prefixes_node = "/ov/tunneld/net/routes/config/ipv4/prefix
 
 constexpr std::size_t prefix_part = 7;
 constexpr std::size_t nhop_part = 9;
-/// Down to what a next hop has below it.
-constexpr unsigned levels_of_a_prefix = 4;
 
 std::string prefix_node(const std::string &prefix)
 {
@@ -132,7 +130,7 @@ void remove_next_hops(const md_dbinfo *dbinfo, const Subnet &subnet)
 
 std::vector<std::string> RoutesModule::patterns() const
 {
-    return patterns_below(prefixes_node, levels_of_a_prefix);
+    return {std::string(prefixes_node) + "/**"};
 }
 
 int RoutesModule::check_change(md_dbinfo *dbinfo, mdb_db_change *change)

@@ -225,19 +225,19 @@ TEST_F(Acls, GoThoughADefaultEntryNamesThem)
     EXPECT_EQ(commit(), "committed");
 }
 
-// The module of ACLs does not see nodes that are deeper.
-TEST_F(Acls, AreEightLevelsDeep)
+TEST_F(Acls, AreCheckedAtAnyDepth)
 {
-    set(acl("a1/b/c/d/e/f/g/h"), "x");
+    set(acl("a1/b/c/d/e/f/g/h/i/j/k/l/m/n"), "x");
     EXPECT_EQ(commit(), "committed");
     EXPECT_EQ(value(acl("a1")), "string a1");
-    for (const char *node :
-         {"a1/b/c/d/e/f/g/h/i", "a1/rmap/m1/prio/99/a/b/c/d", "\\*/b/c/d/e/f/g/h/i"}) {
-        set(acl(node), "x");
-        EXPECT_EQ(commit_in_vain(),
-                  acl(node) +
-                      ": too deep: a name in here has 12 parts at most, not 13 (name-depth)\n");
-    }
+    set(acl("a1/rmap/m1/prio/99/a/b/c/d/e/f"), "x");
+    EXPECT_EQ(commit_in_vain(), acl("a1/rmap/m1/prio/99/a/b/c/d/e/f") +
+                                    ": references to ACLs are kept by the daemon: set the ACL of "
+                                    "a map's entry (acl)\n");
+    set(acl("\\*/b/c/d/e/f/g/h/i/j"), "x");
+    EXPECT_EQ(commit_in_vain(), acl("\\*/b/c/d/e/f/g/h/i/j") +
+                                    ": an ACL's name must not hold \"*\": choose another name "
+                                    "(acl)\n");
 }
 
 TEST_F(Acls, HaveNoReferencesThatUsersWrite)
