@@ -44,7 +44,7 @@ ovhost::Configuration &configuration()
                 std::abort();
             }
         }
-        if (!made->commit("").accepted()) {
+        if (!made->commit(ovhost::daemon_note("")).accepted()) {
             std::abort();
         }
         return made;
@@ -65,7 +65,7 @@ void commit(benchmark::State &state)
             }
         });
         state.ResumeTiming();
-        if (daemon.commit("").outcome != ovhost::CommitOutcome::committed) {
+        if (daemon.commit(ovhost::daemon_note("")).outcome != ovhost::CommitOutcome::committed) {
             state.SkipWithError("the commit was not accepted");
         }
     }

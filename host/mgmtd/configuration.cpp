@@ -125,11 +125,6 @@ CommitReport Configuration::commit(const CommitNote &note)
     return confirmations_.commit(candidate_, note);
 }
 
-CommitReport Configuration::commit(const std::string &comment)
-{
-    return commit(daemon_note(comment));
-}
-
 CommitReport Configuration::rollback(std::uint64_t number, CommitNote note)
 {
     note.rollback_to = number;

@@ -42,9 +42,6 @@ class Configuration
     [[nodiscard]] CheckReport check() { return engine_.check(candidate_); }
     [[nodiscard]] CommitReport commit(const CommitNote &note);
 
-    /// A commit of the daemon itself.
-    [[nodiscard]] CommitReport commit(const std::string &comment);
-
     /// Commits the configuration as it was after a commit (see past.h for which). The candidate
     /// keeps its edits. Throws StoreError.
     [[nodiscard]] CommitReport rollback(std::uint64_t number, CommitNote note);

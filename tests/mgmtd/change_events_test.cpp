@@ -50,12 +50,12 @@ TEST_F(ChangeEvents, TellOfEachKindOfChangeInTheOrderOfNames)
 {
     set("/x/gone", bt_string, "old");
     set("/x/kept", bt_uint8, "1");
-    ASSERT_TRUE(configuration_.commit("").accepted());
+    ASSERT_TRUE(configuration_.commit(daemon_note("")).accepted());
     NotingSession jsond;
     set("/x/new", bt_ipv4addr, "192.0.2.1");
     set("/x/kept", bt_uint8, "2");
     ASSERT_EQ(configuration_.candidate().erase("/x/gone"), std::nullopt);
-    ASSERT_TRUE(configuration_.commit("").accepted());
+    ASSERT_TRUE(configuration_.commit(daemon_note("")).accepted());
     EXPECT_THAT(jsond.events,
                 ElementsAre("/mgmtd/notify/dbchange\n"
                             "/mgmtd/notification/dbchange/0/change_type string delete\n"
@@ -79,7 +79,7 @@ TEST_F(ChangeEvents, KeepNamesEscaped)
 {
     NotingSession jsond;
     set("/x/10.0.0.0\\/8", bt_string, "");
-    ASSERT_TRUE(configuration_.commit("").accepted());
+    ASSERT_TRUE(configuration_.commit(daemon_note("")).accepted());
     EXPECT_THAT(jsond.events,
                 ElementsAre("/mgmtd/notify/dbchange\n"
                             "/mgmtd/notification/dbchange/0/change_type string add\n"
@@ -94,9 +94,9 @@ TEST_F(ChangeEvents, DoNotTellOfWhatDidNotHappen)
     set("/x/a", bt_string, "1");
     (void)configuration_.check();
     set("/ov/tunneld/system/config/mode", bt_string, "x");
-    EXPECT_EQ(configuration_.commit("").outcome, CommitOutcome::refused);
+    EXPECT_EQ(configuration_.commit(daemon_note("")).outcome, CommitOutcome::refused);
     configuration_.discard();
-    EXPECT_EQ(configuration_.commit("").outcome, CommitOutcome::unchanged);
+    EXPECT_EQ(configuration_.commit(daemon_note("")).outcome, CommitOutcome::unchanged);
     EXPECT_THAT(jsond.events, IsEmpty());
 }
 
@@ -104,7 +104,7 @@ TEST_F(ChangeEvents, AreLoggedWhenThereIsNoPeer)
 {
     set("/x/a", bt_string, "1");
     log_.lines.clear();
-    ASSERT_TRUE(configuration_.commit("").accepted());
+    ASSERT_TRUE(configuration_.commit(daemon_note("")).accepted());
     std::vector<std::string> texts;
     for (const auto &line : log_.lines) {
         texts.push_back(std::to_string(line.level) + " " + line.text);

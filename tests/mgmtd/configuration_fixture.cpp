@@ -48,7 +48,7 @@ void ConfigurationTest::erase(const std::string &node)
 
 std::string ConfigurationTest::commit()
 {
-    const CommitReport report = configuration_->commit("");
+    const CommitReport report = configuration_->commit(daemon_note(""));
     EXPECT_THAT(report.warnings, testing::IsEmpty());
     if (report.accepted()) {
         return report.outcome == CommitOutcome::committed ? "committed" : "unchanged";

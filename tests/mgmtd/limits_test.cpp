@@ -25,7 +25,7 @@ class Limits : public DaemonTest
     CommitReport commit(const std::string &name, bn_type type, const std::string &text)
     {
         EXPECT_EQ(configuration_.candidate().set(name, type, text), std::nullopt);
-        return configuration_.commit("");
+        return configuration_.commit(daemon_note(""));
     }
 
     Configuration configuration_{state_.path()};
@@ -53,7 +53,7 @@ TEST_F(Limits, FollowACommitThatTouchesOne)
 TEST_F(Limits, AreZeroWhereTheNodeIsGone)
 {
     ASSERT_EQ(configuration_.candidate().erase("/ov/tunneld/system/config/limits"), std::nullopt);
-    ASSERT_TRUE(configuration_.commit("").accepted());
+    ASSERT_TRUE(configuration_.commit(daemon_note("")).accepted());
     EXPECT_EQ(read_file(limits_file), "expected_mem 0\n"
                                       "max_def_bw 0\n"
                                       "max_loc_flows 0\n"

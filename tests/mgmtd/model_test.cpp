@@ -21,7 +21,7 @@ class Model : public DaemonTest
     CommitReport commit(const std::string &name, bn_type type, const std::string &text)
     {
         EXPECT_EQ(configuration_.candidate().set(name, type, text), std::nullopt);
-        return configuration_.commit("");
+        return configuration_.commit(daemon_note(""));
     }
 
     std::vector<std::string> module_log() const
@@ -49,7 +49,7 @@ TEST_F(Model, FollowsTheConfiguration)
     EXPECT_STREQ(get_config_name(), "m7");
     EXPECT_THAT(module_log(), IsEmpty());
     ASSERT_EQ(configuration_.candidate().erase("/ov/model"), std::nullopt);
-    ASSERT_TRUE(configuration_.commit("").accepted());
+    ASSERT_TRUE(configuration_.commit(daemon_note("")).accepted());
     EXPECT_EQ(get_max_rmap_entries(), 300U);
 }
 

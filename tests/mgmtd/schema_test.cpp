@@ -159,7 +159,7 @@ TEST_F(Schema, RefusesACommitAndLeavesEverythingAsItWas)
     set("/ov/tunneld/system/config/mode", bt_string, "x");
     set("/ov/tunneld/system/config/limits/mem_size", bt_string, "y");
     set("/fine", bt_string, "z");
-    const CommitReport report = configuration_.commit("no");
+    const CommitReport report = configuration_.commit(daemon_note("no"));
     EXPECT_EQ(report.outcome, CommitOutcome::refused);
     EXPECT_THAT(refusals_of(report.refusals),
                 ElementsAre("/ov/tunneld/system/config/limits/mem_size: must be of type uint32 "

@@ -196,7 +196,7 @@ class RandomTunnels : public TunnelTest
     bool commit_both(const Edits &edits)
     {
         edit(edits);
-        const bool accepted = configuration_->commit("").accepted();
+        const bool accepted = configuration_->commit(daemon_note("")).accepted();
         EXPECT_EQ(accepted, model_.commit(edits, present_time()));
         if (!accepted) {
             configuration_->discard();

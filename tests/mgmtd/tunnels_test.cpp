@@ -74,7 +74,7 @@ TEST_F(Tunnels, AreCompletedByTheCommitThatAddsThem)
 {
     add("a");
     set(tunnel("a", "remote"), bt_ipaddr, "192.0.2.1");
-    const CommitReport report = configuration_->commit("");
+    const CommitReport report = configuration_->commit(daemon_note(""));
     EXPECT_EQ(report.changes.size(), 4U) << "the tunnel, its remote, and what the module adds";
     EXPECT_THAT(configuration_->candidate().pending(configuration_->running()), IsEmpty());
 }
