@@ -1,5 +1,5 @@
 // The main program of these tests: the daemons that they start see a network of their own.
-#include "tests/support/private_network.h"
+#include "tests/support/namespaces.h"
 
 #include <gmock/gmock.h>
 #include <gtest/gtest.h>

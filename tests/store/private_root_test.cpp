@@ -15,14 +15,16 @@
 #include <array>
 #include <cerrno>
 #include <cstddef>
-#include <fstream>
+#include <filesystem>
 #include <functional>
 #include <set>
-#include <sstream>
 #include <stdexcept>
+#include <string>
 #include <thread>
 
 #include "tests/store/child.h"
+#include "tests/support/files.h"
+#include "tests/support/namespaces.h"
 #include "tests/support/scratch_dir.h"
 
 namespace
@@ -33,21 +35,11 @@ using ovhost::enter_private_root;
 using ovtest::become_unprivileged;
 using ovtest::in_child;
 using ovtest::ScratchDir;
-
-void write_text(const fs::path &file, const std::string &text)
-{
-    std::ofstream out(file);
-    out << text;
-    if (!out.flush())
-        throw std::runtime_error("cannot write " + file.string());
-}
+using ovtest::write_file;
 
 std::string text_of(const fs::path &file)
 {
-    std::ifstream in(file);
-    std::stringstream text;
-    text << in.rdbuf();
-    return text.str();
+    return ovtest::read_file(file).value_or("");
 }
 
 // Names, types and modes of what is in a directory of the machine.
@@ -74,21 +66,6 @@ std::set<std::string> names_in(const fs::path &dir)
     return names;
 }
 
-// A mount namespace of the test's own, for any user.
-void unshare_mounts()
-{
-    if (::unshare(CLONE_NEWNS) == 0)
-        return;
-    const std::string user = std::to_string(::geteuid());
-    const std::string group = std::to_string(::getegid());
-    if (::unshare(CLONE_NEWUSER | CLONE_NEWNS) != 0) {
-        throw std::runtime_error("these tests need root or user namespaces");
-    }
-    write_text("/proc/self/setgroups", "deny");
-    write_text("/proc/self/uid_map", user + " " + user + " 1");
-    write_text("/proc/self/gid_map", group + " " + group + " 1");
-}
-
 void mount_memory(const char *dir)
 {
     if (::mount("tmpfs", dir, "tmpfs", 0, "mode=0755") != 0) {
@@ -99,7 +76,7 @@ void mount_memory(const char *dir)
 // Puts empty directories in memory over the machine's, so that a test says what is in them.
 void make_up_a_machine()
 {
-    unshare_mounts();
+    ovtest::unshare_as_any_user(CLONE_NEWNS);
     if (::mount(nullptr, "/", nullptr, MS_REC | MS_PRIVATE, nullptr) != 0) {
         throw std::runtime_error("cannot make the mounts private");
     }
@@ -126,9 +103,9 @@ void forbid_unshare()
 std::string use_private_root(const fs::path &dir)
 {
     enter_private_root(dir);
-    write_text("/var/opt/tms/x", "from the host");
-    write_text("/var/opt/tms/output/y", "an output");
-    write_text("/opt/orvale/z", "an etc file");
+    write_file("/var/opt/tms/x", "from the host");
+    write_file("/var/opt/tms/output/y", "an output");
+    write_file("/opt/orvale/z", "an etc file");
     if (text_of(dir / "var/opt/tms/x") != "from the host")
         return "not in the root";
     return "done";
@@ -217,7 +194,7 @@ TEST_F(PrivateRoot, ARelativeDirectoryIsFound)
     EXPECT_EQ(in_child([&] {
                   fs::current_path(scratch_.path());
                   enter_private_root(".");
-                  write_text("/var/opt/tms/x", "text");
+                  write_file("/var/opt/tms/x", "text");
                   return text_of("var/opt/tms/x");
               }),
               "text");
@@ -226,7 +203,7 @@ TEST_F(PrivateRoot, ARelativeDirectoryIsFound)
 TEST_F(PrivateRoot, WhatIsInTheDirectoryAlreadyIsSeen)
 {
     fs::create_directories(scratch_ / "var/opt/tms");
-    write_text(scratch_ / "var/opt/tms/x", "from before");
+    write_file(scratch_ / "var/opt/tms/x", "from before");
     EXPECT_EQ(in_child([&] {
                   enter_private_root(scratch_.path());
                   return text_of("/var/opt/tms/x");
@@ -286,7 +263,7 @@ TEST_F(PrivateRoot, AUserStaysBoundByPermissions)
 {
     expect_as_user("denied", [&]() -> std::string {
         enter_private_root(scratch_.path());
-        write_text("/var/opt/tms/closed", "text");
+        write_file("/var/opt/tms/closed", "text");
         ::chmod("/var/opt/tms/closed", 0000);
         if (::open("/var/opt/tms/closed", O_RDONLY) >= 0)
             return "opened";
@@ -329,7 +306,7 @@ TEST_P(PrivateRootOnMachine, ExistingPathsAreCovered)
                   [] {
                       for (const char *dir : {"/opt/orvale", "/var/opt/tms"}) {
                           fs::create_directory(dir);
-                          write_text(fs::path(dir) / "machine", "kept");
+                          write_file(fs::path(dir) / "machine", "kept");
                       }
                   },
                   [&]() -> std::string {
@@ -345,12 +322,12 @@ TEST_P(PrivateRootOnMachine, NeighboursOfMissingPathsStayVisible)
     EXPECT_EQ(on_machine(
                   [] {
                       fs::create_directories("/opt/their/bin");
-                      write_text("/opt/their/bin/program", "theirs");
-                      write_text("/opt/file", "a file");
+                      write_file("/opt/their/bin/program", "theirs");
+                      write_file("/opt/file", "a file");
                       fs::create_symlink("their/bin", "/opt/link");
                       fs::create_directory("/opt/mounted");
                       mount_memory("/opt/mounted");
-                      write_text("/opt/mounted/inside", "mounted");
+                      write_file("/opt/mounted/inside", "mounted");
                       fs::create_directory("/opt/closed");
                       ::chmod("/opt/closed", 0700);
                   },
@@ -398,7 +375,7 @@ TEST_P(PrivateRootOnMachine, ADirectoryBelowAPathItself)
                   },
                   []() -> std::string {
                       enter_private_root("/opt/orvale/root");
-                      write_text("/opt/orvale/z", "text");
+                      write_file("/opt/orvale/z", "text");
                       return fs::exists("/opt/orvale/root") ? "not covered" : "done";
                   }),
               "done");

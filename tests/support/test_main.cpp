@@ -1,7 +1,7 @@
 // The main program of tests that call the library: the library's fixed directories and the kernel's
 // network interfaces are the program's own before the first test runs.
 #include "host/mgmtd/private_root.h"
-#include "tests/support/private_network.h"
+#include "tests/support/namespaces.h"
 #include "tests/support/scratch_dir.h"
 
 #include <gmock/gmock.h>
