@@ -71,7 +71,7 @@ std::optional<std::string> apply_entry(Candidate &candidate, ov_defdb_line_kind 
 }
 
 /// A fault names its node beside the message, where some messages begin with it too.
-std::string without_name(std::string message, const std::string &name)
+std::string without_name(const std::string &message, const std::string &name)
 {
     return message.starts_with(name + ": ") ? message.substr(name.size() + 2) : message;
 }
