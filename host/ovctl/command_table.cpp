@@ -365,7 +365,7 @@ constexpr Command table[] = {
      render_tunnel_tables,
      "the query"},
     {"show interfaces",
-     "List all interfaces with who uses them",
+     "List all interfaces, whether they are enabled, and who uses them",
      "ovctl show interfaces",
      {},
      "show",
