@@ -9,6 +9,13 @@ namespace mgmtd_test
 
 using namespace ovhost;
 
+ConfigurationTest::ConfigurationTest(Start start)
+{
+    if (start == Start::now) {
+        restart();
+    }
+}
+
 void ConfigurationTest::restart()
 {
     configuration_.reset();

@@ -12,7 +12,10 @@ namespace mgmtd_test
 class ConfigurationTest : public DaemonTest
 {
   protected:
-    ConfigurationTest() { restart(); }
+    /// Later: by restart() or put_in_store(), once the test has prepared what the daemon finds.
+    enum class Start { now, later };
+
+    explicit ConfigurationTest(Start start = Start::now);
 
     /// Ends the daemon and starts it again on its store.
     void restart();

@@ -14,7 +14,7 @@ namespace mgmtd_test
 class TunnelTest : public ConfigurationTest
 {
   protected:
-    TunnelTest();
+    explicit TunnelTest(Start start = Start::now);
 
     void pass(uint64 milliseconds);
 
