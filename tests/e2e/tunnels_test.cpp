@@ -12,6 +12,7 @@ namespace
 {
 
 using namespace e2e;
+using testing::AllOf;
 using testing::HasSubstr;
 using testing::StartsWith;
 
@@ -85,13 +86,19 @@ TEST_F(Tunnels, KeepTheirIdsOverACrashThousandsOfThem)
         const std::string name = "t" + std::to_string(i);
         text += "/ov/tunneld/tunnel/config/" + name + ",string," + name + "\n";
     }
+    text += "/ov/tunneld/tunnel/config/" + last + "/alias,string,hq\n";
     ASSERT_EQ(ovctl({"load", "-"}, text).exit_code, 0);
     ASSERT_EQ(ovctl({"commit"}), done("commit 2: " + std::to_string(3 * number) + " changes\n"));
     const Outcome before = ovctl({"show", "tunnels"});
+    const Outcome last_before = ovctl({"show", "tunnel", "--name", last});
+    EXPECT_THAT(last_before.out, AllOf(StartsWith("name                " + last + "\nid "),
+                                       HasSubstr("\nalias               hq\n")));
     (void)stop(SIGKILL);
     start_quietly("warning", {"--model", "big"});
     EXPECT_TRUE(ovctl({"show", "tunnels"}) == before);
-    EXPECT_THAT(ovctl({"show", "tunnel", "--name", last}).out, HasSubstr("id "));
+    EXPECT_EQ(ovctl({"show", "tunnel", "--name", last}), last_before);
+    EXPECT_EQ(ovctl({"show", "tunnel", "--alias", "hq"}), last_before);
+    EXPECT_EQ(ovctl({"show", "tunnel", "--alias", last}).exit_code, 1) << "its name is no alias";
     EXPECT_THAT(ovctl({"show", "tunnel-tables"}).out,
                 HasSubstr("IDs in use          " + std::to_string(number) + "\n"));
 }
