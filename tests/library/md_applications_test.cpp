@@ -2,6 +2,7 @@
 #include "orvale/md_tunneld_tunnel_common.h"
 
 #include "tests/library/library_test.h"
+#include "tests/library/map_changes.h"
 
 #include <memory>
 #include <new>
@@ -201,6 +202,52 @@ TEST_F(AppInAcl, IsListedByAPathThatIsCutAt511Characters)
     EXPECT_EQ(in_acl("mail"), "0 yes");
 }
 
+// 600 characters are cut to 488, and the path ends there.
+TEST_F(AppInAcl, IsListedByAPathThatHasLongNamesWhole)
+{
+    use(acl_node(std::string(255, 'a'), "10"), "of 255");
+    use(acl_node(std::string(256, 'a'), "10"), "of 256");
+    use(acl_node(std::string(600, 'a'), "10"), "of 600");
+    EXPECT_EQ(in_acl("of 255"), "0 yes");
+    EXPECT_EQ(in_acl("of 256"), "0 yes");
+    forget_calls();
+    EXPECT_EQ(in_acl("of 600"), "0 no");
+    EXPECT_EQ(calls_of(Operation::mdb_get_tstr_array).back(),
+              children_call(std::string(acl_root) + '/' + std::string(488, 'a')));
+}
+
+TEST_F(AppInAcl, IsFoundInEntriesOfLongNames)
+{
+    for (const std::size_t size : {255U, 256U, 600U}) {
+        const std::string app = "of " + std::to_string(size);
+        use(acl_node("a", std::string(size, '1')), app);
+        EXPECT_EQ(in_acl(app.c_str()), "0 yes");
+    }
+}
+
+// Names go into paths as they are: a slash makes two levels of one name.
+TEST_F(AppInAcl, IsLookedForTwoLevelsDeepWhereAnAclHasASlash)
+{
+    use(acl_node(written("a/b"), "10"));
+    EXPECT_EQ(in_acl("web"), "0 no");
+    EXPECT_THAT(
+        calls_of(Operation::mdb_get_tstr_array),
+        ElementsAre(children_call(acl_root), children_call("/ov/tunneld/acl/config/a/b/entry")));
+    EXPECT_EQ(num_calls(Operation::mdb_get_node_binding), 0U);
+    use(acl_node("a/b", "10"));
+    EXPECT_EQ(in_acl("web"), "0 yes");
+}
+
+TEST_F(AppInAcl, IsReadTwoLevelsDeepWhereAnEntryHasASlash)
+{
+    use(acl_node("a", written("1/2")));
+    EXPECT_EQ(in_acl("web"), "0 no");
+    EXPECT_THAT(calls_of(Operation::mdb_get_node_binding),
+                ElementsAre(node_call(acl_node("a", "1/2"))));
+    use(acl_node("a", "1/2"));
+    EXPECT_EQ(in_acl("web"), "0 yes");
+}
+
 // "/ov/tunneld/acl/config/a/entry/" and "/application" leave 980 characters of the node.
 TEST_F(AppInAcl, IsReadAtANodeThatIsCutAt1023Characters)
 {
@@ -320,6 +367,84 @@ TEST_F(AppInMap, IsLookedForWhenNobodyAsksForTheAnswer)
     use(map_node(route_root, "a", "10"));
     EXPECT_EQ(
         in_library(md_find_app_name_in_xxxmap, "web", host_.db(), route_root, nullptr, nullptr), 0);
+}
+
+// "/ov/tunneld/route_map/config/map/" and "/prio" leave 473 characters of the list's path.
+TEST_F(AppInMap, IsListedByAPathThatIsCutAt511Characters)
+{
+    use(map_node(route_root, std::string(473, 'a'), "10"));
+    EXPECT_EQ(in_map("web", route_root), "0 yes");
+
+    const std::string too_long(478, 'b');
+    use(map_node(route_root, too_long, "10"), "mail");
+    EXPECT_EQ(in_map("mail", route_root), "0 no");
+    // The path ends before "/prio", so that "prio" itself is taken for an entry.
+    use(std::string(route_root) + '/' + too_long + "/prio/match/0/application", "mail");
+    EXPECT_EQ(in_map("mail", route_root), "0 yes");
+}
+
+// 600 characters are cut to 478, and the path ends there.
+TEST_F(AppInMap, IsListedByAPathThatHasLongNamesWhole)
+{
+    use(map_node(route_root, std::string(255, 'a'), "10"), "of 255");
+    use(map_node(route_root, std::string(256, 'a'), "10"), "of 256");
+    use(map_node(route_root, std::string(600, 'a'), "10"), "of 600");
+    EXPECT_EQ(in_map("of 255", route_root), "0 yes");
+    EXPECT_EQ(in_map("of 256", route_root), "0 yes");
+    forget_calls();
+    EXPECT_EQ(in_map("of 600", route_root), "0 no");
+    EXPECT_EQ(calls_of(Operation::mdb_get_tstr_array).back(),
+              children_call(std::string(route_root) + '/' + std::string(478, 'a')));
+}
+
+TEST_F(AppInMap, IsFoundInEntriesOfLongNames)
+{
+    for (const std::size_t size : {255U, 256U, 600U}) {
+        const std::string app = "of " + std::to_string(size);
+        use(map_node(route_root, "a", std::string(size, '1')), app);
+        EXPECT_EQ(in_map(app.c_str(), route_root), "0 yes");
+    }
+}
+
+// "/ov/tunneld/route_map/config/map/a/prio/" and "/match/0/application" leave 963 characters of the
+// node.
+TEST_F(AppInMap, IsReadAtANodeThatIsCutAt1023Characters)
+{
+    const std::string longest(963, 'e');
+    ASSERT_EQ(map_node(route_root, "a", longest).size(), 1023U);
+    use(map_node(route_root, "a", longest));
+    EXPECT_EQ(in_map("web", route_root), "0 yes");
+
+    const std::string too_long(983, 'f');
+    use(map_node(route_root, "a", too_long), "mail");
+    EXPECT_EQ(in_map("mail", route_root), "0 no");
+    const std::string entry = std::string(route_root) + "/a/prio/" + too_long;
+    use(entry, "mail");
+    const TestArray bnames = new_array();
+    EXPECT_EQ(in_map("mail", route_root, bnames.get()), "0 yes");
+    EXPECT_THAT(texts(bnames.get()), ElementsAre(entry));
+}
+
+TEST_F(AppInMap, IsLookedForTwoLevelsDeepWhereAMapHasASlash)
+{
+    use(map_node(route_root, written("m/n"), "10"));
+    EXPECT_EQ(in_map("web", route_root), "0 no");
+    EXPECT_THAT(calls_of(Operation::mdb_get_tstr_array),
+                ElementsAre(children_call(route_root),
+                            children_call("/ov/tunneld/route_map/config/map/m/n/prio")));
+    EXPECT_EQ(num_calls(Operation::mdb_get_node_binding), 0U);
+    use(map_node(route_root, "m/n", "10"));
+    EXPECT_EQ(in_map("web", route_root), "0 yes");
+}
+
+TEST_F(AppInMap, IsReadTwoLevelsDeepWhereAnEntryHasASlash)
+{
+    use(map_node(route_root, "m", written("1/2")));
+    EXPECT_EQ(in_map("web", route_root), "0 no");
+    EXPECT_THAT(calls_of(Operation::mdb_get_node_binding),
+                ElementsAre(node_call(map_node(route_root, "m", "1/2"))));
+    use(map_node(route_root, "m", "1/2"));
+    EXPECT_EQ(in_map("web", route_root), "0 yes");
 }
 
 TEST_F(AppInMap, OfNothingIsAnError)
@@ -597,6 +722,33 @@ TEST_F(AppRules, HaveNodesThatAreCutAt255Characters)
     host_.set(std::string(app_root) + '/' + too_long, bt_string, "b");
     EXPECT_EQ(count("b"), "0 1");
     EXPECT_EQ(names(), "0 a b");
+}
+
+// Whatever follows the 232nd character of such a name, the node ends there.
+TEST_F(AppRules, OfLongNamesShareANode)
+{
+    for (const std::size_t size : {255U, 256U, 600U}) {
+        add_rule(std::string(size, 'r'), "a");
+        EXPECT_EQ(count("a"), "14001 0") << size;
+        EXPECT_EQ(names(), "14001 untouched") << size;
+    }
+    // A rule of its own besides.
+    host_.set(std::string(app_root) + '/' + std::string(232, 'r'), bt_string, "b");
+    EXPECT_EQ(count("a"), "0 0");
+    EXPECT_EQ(count("b"), "0 4");
+    EXPECT_EQ(names(), "0 b");
+}
+
+TEST_F(AppRules, WithASlashInTheirNamesHaveNone)
+{
+    add_rule(written("1/2"), "a");
+    EXPECT_EQ(count("a"), "14001 0");
+    EXPECT_EQ(names(), "14001 untouched");
+    EXPECT_THAT(calls_of(Operation::mdb_get_node_value_tstr),
+                ElementsAre("mdb_get_node_value_tstr(null, *, "
+                            "\"/ov/tunneld/app/config/1/2/name\", 0, null, *)",
+                            "mdb_get_node_value_tstr(null, *, "
+                            "\"/ov/tunneld/app/config/1/2/name\", 0, null, *)"));
 }
 
 TEST_F(AppRules, OfNothingAreAnError)

@@ -308,14 +308,21 @@ TEST_P(AclGuardOfEveryKind, ALongNameIsCut)
     EXPECT_EQ(last_log_line(), gated_line(6, "Ref <m1/10>, <" + fits + '/' + fits + '>'));
 }
 
-TEST_P(AclGuardOfEveryKind, LongNamesOfMapsAreKeptWhole)
+TEST_P(AclGuardOfEveryKind, LongNamesOfMapsAndEntriesAreKeptWhole)
 {
     const MapKind &kind = GetParam();
-    const std::string map(600, 'm');
-    give_entry(kind, map, "10");
-    EXPECT_EQ(remove_acl(kind), 0);
-    EXPECT_EQ(refused().size(), 1U);
-    EXPECT_EQ(log_line(2), path_line(kind.acl_node(map, "10")));
+    for (const std::size_t size : {255U, 256U, 600U}) {
+        const std::string map(size, 'm');
+        const std::string priority = std::string(size - 2, '0') + "10";
+        const std::string acl = "a" + std::to_string(size);
+        set_node(commit_.olddb, kind.reference(acl, map, priority), "10", bt_uint32);
+        commit_.set_new(kind.acl_node(map, priority), acl);
+        forget_calls();
+        EXPECT_EQ(remove_acl(kind, acl), 0);
+        EXPECT_THAT(refused(), ElementsAre(refusals.at(kind.mtype)));
+        EXPECT_EQ(log_line(2), path_line(kind.acl_node(map, priority)));
+        commit_.commit.refusals.clear();
+    }
 }
 
 // Names go into paths as they are: a slash makes two levels of one name, and the parts of a
@@ -346,6 +353,16 @@ TEST_P(AclGuardOfEveryKind, AMapWithASlashInItsNameIsLookedUpTwoLevelsDeep)
     EXPECT_EQ(remove_acl(kind), 0);
     EXPECT_THAT(refused(), IsEmpty());
     EXPECT_EQ(last_log_line(), path_line(kind.acl_node("m/n", "10")));
+}
+
+TEST_P(AclGuardOfEveryKind, AnEntryWithASlashInItsNameIsLookedUpTwoLevelsDeep)
+{
+    const MapKind &kind = GetParam();
+    set_node(commit_.olddb, kind.reference("a1", "m1", written("1/2")), "10", bt_uint32);
+    commit_.set_new(kind.acl_node("m1", written("1/2")), "a1");
+    EXPECT_EQ(remove_acl(kind), 0);
+    EXPECT_THAT(refused(), IsEmpty());
+    EXPECT_EQ(last_log_line(), path_line(kind.acl_node("m1", "1/2")));
 }
 
 TEST_P(AclGuardOfEveryKind, WithoutAListThereAreNoReferences)

@@ -137,11 +137,35 @@ TEST_F(IpVersion, IsGivenToNoneWhereThereIsNone)
 
 TEST_F(IpVersion, IsGivenToEntriesOfLongNames)
 {
-    const std::string map(600, 'm');
-    const std::string priority(600, 'p');
-    set(root + '/' + map + "/prio/" + priority + "/seq");
+    for (const std::size_t size : {255U, 256U, 600U}) {
+        const std::string entry =
+            root + '/' + std::string(size, 'm') + "/prio/" + std::string(size, 'p');
+        mdb_db db;
+        db.writable = true;
+        set_node(db, entry + "/seq", "x");
+        EXPECT_EQ(in_library(md_xmap_add_ipver, &db, root.c_str()), 0);
+        EXPECT_THAT(nodes(db, "/"),
+                    ElementsAre(entry + "/match/0/ipver string ipv4", entry + "/seq string x"));
+    }
+}
+
+// Names go into paths as they are: a slash makes two levels of one name.
+TEST_F(IpVersion, IsGivenToNoEntryOfAMapWithASlashInItsName)
+{
+    const std::string entry = root + '/' + written("m/n") + "/prio/10/seq";
+    set(entry);
     EXPECT_EQ(add_ipver(), 0);
-    EXPECT_EQ(all().front(), root + '/' + map + "/prio/" + priority + "/match/0/ipver string ipv4");
+    EXPECT_EQ(log_lines().back(), gated_line(6, "md_xmap_add_ipver: num prios for m/n: 0"));
+    EXPECT_THAT(all(), ElementsAre(entry + " string x"));
+}
+
+TEST_F(IpVersion, IsGivenTwoLevelsDeepWhereAnEntryHasASlash)
+{
+    const std::string entry = root + "/m/prio/" + written("1/2") + "/seq";
+    set(entry);
+    EXPECT_EQ(add_ipver(), 0);
+    EXPECT_THAT(all(),
+                ElementsAre(root + "/m/prio/1/2/match/0/ipver string ipv4", entry + " string x"));
 }
 
 TEST_F(IpVersion, WithoutInterestInTracesIsAddedWithoutThem)
@@ -221,6 +245,16 @@ TEST_F(MatchBinding, ThatOnlyHasChildrenIsAbsent)
     EXPECT_THAT(all(), ElementsAre("/ov/a/b string x"));
 }
 
+TEST_F(MatchBinding, OfWhateverNameIsRemoved)
+{
+    for (const std::string &name : {std::string(255, 'b'), std::string(256, 'b'),
+                                    std::string(600, 'b'), written("b/c"), written("b\\c")}) {
+        set("/ov/a/" + name);
+        EXPECT_EQ(delete_binding("/ov/a/" + name), 0);
+        EXPECT_THAT(all(), IsEmpty()) << name;
+    }
+}
+
 TEST_F(MatchBinding, ThatMayNotBeWrittenPassesUpTheCode)
 {
     set("/ov/a/b");
@@ -268,7 +302,7 @@ TEST_F(MatchEntries, AreAskedForThirteenTimes)
 
 TEST_F(MatchEntries, OfWhateverKindOfMapAreTheSame)
 {
-    for (const int mtype : {-1, 0, 5, 7, 1000}) {
+    for (const int mtype : {-1, 0, 5, 6, 7, 8, 1000}) {
         set("/ov/m/application");
         EXPECT_EQ(in_library(md_xmap_delete_match_entries, &db_, mtype, "/ov/m"), 0);
         EXPECT_THAT(all(), IsEmpty()) << mtype;
@@ -309,6 +343,37 @@ TEST_F(MatchEntries, HaveAPathThatIsCutAt255Characters)
     set(too_long + "/applicat");
     EXPECT_EQ(delete_entries(too_long), 0);
     EXPECT_THAT(all(), ElementsAre(too_long + "/application string x"));
+}
+
+// Nothing of "/application" is left: what has the first 255 characters for its name is removed.
+TEST_F(MatchEntries, OfALongNodeAreTheNodeThatItsNameIsCutTo)
+{
+    for (const std::size_t size : {255U, 256U, 600U}) {
+        mdb_db db;
+        db.writable = true;
+        const std::string node = "/ov/" + std::string(size - 4, 'm');
+        const std::string application = node + "/application";
+        set_node(db, application, "x");
+        EXPECT_EQ(in_library(md_xmap_delete_match_entries, &db, MAP_TYPE_R, node.c_str()), 0);
+        EXPECT_THAT(nodes(db, "/"), ElementsAre(application + " string x")) << size;
+
+        set_node(db, node.substr(0, 255), "y");
+        EXPECT_EQ(in_library(md_xmap_delete_match_entries, &db, MAP_TYPE_R, node.c_str()), 0);
+        if (size == 255) {
+            EXPECT_THAT(nodes(db, "/"), IsEmpty());
+        } else {
+            EXPECT_THAT(nodes(db, "/"), ElementsAre(application + " string x")) << size;
+        }
+    }
+}
+
+TEST_F(MatchEntries, OfANodeWithASlashInItsNameAreItsOwn)
+{
+    const std::string node = "/ov/" + written("m/n");
+    set(node + "/application");
+    set("/ov/m/n/application");
+    EXPECT_EQ(delete_entries(node), 0);
+    EXPECT_THAT(all(), ElementsAre("/ov/m/n/application string x"));
 }
 
 TEST_F(MatchEntries, OfNothingAreNone)

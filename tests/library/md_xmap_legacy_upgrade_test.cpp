@@ -759,6 +759,47 @@ TEST_F(LegacyUpgrade, ReadsWholeFieldsOfTheLongestEntry)
                 ElementsAre(entry + "/match/0/matchstr string src_ip:2001:db8::/32,dst_ip:::/0"));
 }
 
+// 600 characters of a map's name are cut to 478: its entries are not found.
+TEST_F(LegacyUpgrade, ConvertsMapsOfLongNamesUpToWhereTheirPathIsCut)
+{
+    for (const std::size_t size : {255U, 256U, 600U}) {
+        const std::string match = root + '/' + std::string(size, 'm') + "/prio/10/match/0/";
+        set(match + "dscp", "ef");
+        EXPECT_EQ(upgrade(), 0);
+        EXPECT_THAT(
+            nodes(new_db_, root + '/' + std::string(size, 'm')),
+            ElementsAre(match + (size == 600 ? "dscp string ef" : "matchstr string dscp:ef")));
+    }
+}
+
+// 600 characters of a priority are cut to 471: nothing is read there, and the match string is
+// "any".
+TEST_F(LegacyUpgrade, ConvertsEntriesOfLongNamesUpToWhereTheirNodeIsCut)
+{
+    for (const std::size_t size : {255U, 256U}) {
+        const std::string entry = root + "/m/prio/" + std::string(size, 'p');
+        set(entry + "/match/0/dscp", "ef");
+        EXPECT_EQ(upgrade(), 0);
+        EXPECT_THAT(nodes(new_db_, entry), ElementsAre(entry + "/match/0/matchstr string dscp:ef"));
+    }
+    const std::string too_long = root + "/n/prio/" + std::string(600, 'p');
+    const std::string cut = root + "/n/prio/" + std::string(471, 'p');
+    ASSERT_EQ(cut.size(), 511U);
+    set(too_long + "/match/0/dscp", "ef");
+    EXPECT_EQ(upgrade(), 0);
+    EXPECT_THAT(nodes(new_db_, root + "/n"),
+                ElementsAre(cut + "/matchstr string any", too_long + "/match/0/dscp string ef"));
+}
+
+TEST_F(LegacyUpgrade, TakesAnEntryWithASlashInItsNameForOneTwoLevelsDeep)
+{
+    const std::string field = root + "/m/prio/" + written("1/2") + "/match/0/dscp";
+    set(field, "ef");
+    EXPECT_EQ(upgrade(), 0);
+    EXPECT_THAT(nodes(new_db_, root), ElementsAre(root + "/m/prio/1/2/match/0/matchstr string any",
+                                                  field + " string ef"));
+}
+
 TEST_F(LegacyUpgrade, DoesNotFindEntriesOfAMapWithASlashInItsName)
 {
     set(root + '/' + written("a/b") + "/prio/10/match/0/dscp", "ef");

@@ -182,13 +182,39 @@ TEST_F(PreferredInterface, BehindANodeWithoutNameIsAnError)
     EXPECT_EQ(num_calls(Operation::bn_binding_name_to_parts), 0U);
 }
 
-TEST_F(PreferredInterface, IsFoundInMapsOfLongNames)
+TEST_F(PreferredInterface, IsFoundInMapsAndEntriesOfLongNames)
 {
-    const std::string entry = std::string(600, 'm') + "/prio/" + std::string(300, 'p');
-    set_mode(entry, "preferred-if");
+    for (const std::size_t size : {255U, 256U, 600U}) {
+        const std::string map(size, 'm');
+        const std::string priority(size, 'p');
+        MapCommit commit;
+        commit.set_both(root + map + "/prio/" + priority + "/set/0/auto_mod", "preferred-if");
+        tbool found = false;
+        EXPECT_EQ(in_library(md_preferred_if_is_used_in_rmap, nullptr, &commit.dbinfo, &found), 0);
+        EXPECT_TRUE(found) << size;
+        EXPECT_EQ(log_lines().back(),
+                  gated_line(5, "Found preferred_if in " + map + ':' + priority + '.'));
+    }
+}
+
+// Names go into paths as they are: a slash makes two levels of one name.
+TEST_F(PreferredInterface, IsReadTwoLevelsDeepWhereAMapHasASlash)
+{
+    set_mode(written("m/n") + "/prio/10", "preferred-if");
+    EXPECT_EQ(is_used(), "0 no");
+    EXPECT_THAT(calls_of(Operation::mdb_get_node_value_tstr),
+                ElementsAre(value_call("m/n/prio/10/set/0/auto_mod")));
+    map_commit_.set_old(root + "m/n/prio/10/set/0/auto_mod", "preferred-if");
     EXPECT_EQ(is_used(), "0 yes");
-    EXPECT_EQ(log_lines().back(), gated_line(5, "Found preferred_if in " + std::string(600, 'm') +
-                                                    ':' + std::string(300, 'p') + '.'));
+    EXPECT_EQ(log_lines().back(), gated_line(5, "Found preferred_if in m/n:10."));
+}
+
+TEST_F(PreferredInterface, IsReadTwoLevelsDeepWhereAnEntryHasASlash)
+{
+    set_mode("m/prio/" + written("1/2"), "preferred-if");
+    EXPECT_EQ(is_used(), "0 no");
+    EXPECT_THAT(calls_of(Operation::mdb_get_node_value_tstr),
+                ElementsAre(value_call("m/prio/1/2/set/0/auto_mod")));
 }
 
 TEST_F(PreferredInterface, IsSilentBelowTheThreshold)
@@ -349,6 +375,39 @@ TEST_F(UsedVlan, OfALongNameIsCutAt255Characters)
     set_interface("a/prio/10", longest + 'v');
     EXPECT_EQ(remove(longest + 'v'), 0);
     EXPECT_THAT(map_commit_.commit.refusals, IsEmpty());
+}
+
+TEST_F(UsedVlan, WithASlashInItsNameIsLikeAnyOther)
+{
+    set_interface("a/prio/10", "v/7");
+    EXPECT_EQ(remove(written("v/7")), 0);
+    EXPECT_THAT(map_commit_.commit.refusals, ElementsAre(refusal("v/7")));
+}
+
+TEST_F(UsedVlan, IsReadTwoLevelsDeepWhereAMapHasASlash)
+{
+    set_interface(written("m/n") + "/prio/10", "vlan7");
+    EXPECT_EQ(remove("vlan7"), 0);
+    EXPECT_THAT(map_commit_.commit.refusals, IsEmpty());
+    EXPECT_THAT(calls_of(Operation::mdb_get_node_value_tstr),
+                ElementsAre(value_call("m/n/prio/10/set/0/auto_prefif")));
+    map_commit_.set_old(root + "m/n/prio/10/set/0/auto_prefif", "vlan7");
+    EXPECT_EQ(remove("vlan7"), 0);
+    EXPECT_THAT(map_commit_.commit.refusals, ElementsAre(refusal("vlan7")));
+    EXPECT_EQ(log_lines().back(), gated_line(5, "Found VLAN vlan7 in m/n:10."));
+}
+
+TEST_F(UsedVlan, IsFoundInMapsAndEntriesOfLongNames)
+{
+    for (const std::size_t size : {255U, 256U, 600U}) {
+        MapCommit commit;
+        commit.set_both(root + std::string(size, 'm') + "/prio/" + std::string(size, 'p') +
+                            "/set/0/auto_prefif",
+                        "vlan7");
+        MapChange removal(mdct_delete, "/a/b/c/d/e/f/g/vlan7");
+        EXPECT_EQ(in_library(md_vlan_is_used_in_rmap, removal.record(), &commit.dbinfo), 0);
+        EXPECT_THAT(commit.commit.refusals, ElementsAre(refusal("vlan7"))) << size;
+    }
 }
 
 TEST_F(UsedVlan, WithPercentSignsStandsInTheMessageAsItIs)
