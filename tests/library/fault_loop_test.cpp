@@ -1,6 +1,7 @@
 // Runs every row of the fault table with every host operation that it calls failing in turn: the
 // first call, the second, and so on until a run ends without the fault being struck.
 #include "tests/library/fault_rows.h"
+#include "tests/library/map_changes.h"
 #include "tests/support/allocation_layer.h"
 
 #include <gmock/gmock.h>
@@ -109,14 +110,43 @@ std::string describe(const Fault &fault)
            std::to_string(fault.code);
 }
 
-void expect_outcome(const FaultRow &row, const Outcome &outcome, const std::string &answer,
-                    int code)
+// A situation that is set up, and the call in it.
+class Attempt
+{
+  public:
+    explicit Attempt(const FaultRow &row) : row_(row)
+    {
+        row.set_up(host_);
+        is_writable_ = host_.db()->writable;
+        before_ = nodes(*host_.db(), "/");
+        forget_calls();
+    }
+
+    std::string call() { return row_.call(host_); }
+
+    // A database that may not be written, an old one above all, stays as it was.
+    bool leaves_database_alone()
+    {
+        return is_writable_ ||
+               (nodes(*host_.db(), "/") == before_ && host_.db()->refused_writes == 0);
+    }
+
+  private:
+    const FaultRow &row_;
+    HostFixture host_;
+    bool is_writable_ = false;
+    std::vector<std::string> before_;
+};
+
+void expect_outcome(const FaultRow &row, const Outcome &outcome, Attempt &attempt,
+                    const std::string &answer, int code)
 {
     ExpectedTrace expected;
     for (const ExpectedLine &line : outcome.log) {
         expected.add(line, code);
     }
     EXPECT_EQ(answer, with_code(outcome.answer, code));
+    EXPECT_TRUE(attempt.leaves_database_alone());
     EXPECT_EQ(log_lines(), expected.lines);
     EXPECT_EQ(num_calls(Operation::bail_debug), expected.exits);
     EXPECT_EQ(num_calls(Operation::bail_quiet_debug), expected.quiet_exits);
@@ -133,14 +163,12 @@ void expect_outcome(const FaultRow &row, const Outcome &outcome, const std::stri
 bool run_with(const FaultRow &row, const Fault &fault)
 {
     SCOPED_TRACE(describe(fault));
-    HostFixture host;
-    row.set_up(host);
-    forget_calls();
+    Attempt attempt(row);
     arm(fault);
-    const std::string answer = row.call(host);
+    const std::string answer = attempt.call();
     disarm();
     if (!fault_struck()) {
-        expect_outcome(row, row.without_fault, answer, 0);
+        expect_outcome(row, row.without_fault, attempt, answer, 0);
         return false;
     }
     const Outcome *const outcome = find_outcome(row, fault);
@@ -148,7 +176,7 @@ bool run_with(const FaultRow &row, const Fault &fault)
         ADD_FAILURE() << "the row does not say what comes of it; the answer was " << answer;
         return true;
     }
-    expect_outcome(row, *outcome, answer, fault.code);
+    expect_outcome(row, *outcome, attempt, answer, fault.code);
     return true;
 }
 
@@ -180,17 +208,15 @@ std::vector<Fault> ways_to_fail(Operation operation)
 // The operations that the row calls when nothing fails.
 std::vector<Operation> operations_called(const FaultRow &row)
 {
-    HostFixture host;
-    row.set_up(host);
-    forget_calls();
-    const std::string answer = row.call(host);
+    Attempt attempt(row);
+    const std::string answer = attempt.call();
     std::vector<Operation> called;
     for (std::size_t i = 0; i < num_operations; ++i) {
         if (num_calls(static_cast<Operation>(i)) != 0) {
             called.push_back(static_cast<Operation>(i));
         }
     }
-    expect_outcome(row, row.without_fault, answer, 0);
+    expect_outcome(row, row.without_fault, attempt, answer, 0);
     return called;
 }
 
