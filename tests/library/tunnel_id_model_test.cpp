@@ -1,10 +1,14 @@
 // A long random sequence of operations on the tunnel ID allocator, beside a model of it.
 #include "tests/library/library_test.h"
 #include "tests/library/tunnel_ids.h"
+#include "tests/support/sanitized.h"
 
 #include <algorithm>
 #include <list>
+#include <ostream>
 #include <random>
+#include <set>
+#include <utility>
 
 using namespace ovtest;
 
@@ -35,7 +39,7 @@ class AllocatorModel
         }
         Record &record = records_[id];
         if (record.name) {
-            record.name.reset();
+            rename(id, std::nullopt);
             const auto place = std::ranges::find(order_, id);
             if (place == order_.end()) {
                 return 14004;
@@ -47,7 +51,7 @@ class AllocatorModel
         if (fault == SetFault::dup) {
             return code;
         }
-        record.name = name;
+        rename(id, name);
         if (fault == SetFault::insert) {
             return code;
         }
@@ -64,7 +68,7 @@ class AllocatorModel
         if (!id) {
             return 14004;
         }
-        records_[*id].name.reset();
+        rename(*id, std::nullopt);
         records_[*id].freed_at = now;
         free_.push_back(*id);
         const auto place = std::ranges::find(order_, *id);
@@ -75,12 +79,12 @@ class AllocatorModel
         return 0;
     }
 
+    // The lowest ID of those with the name.
     std::optional<uint32> find(const std::string &name) const
     {
-        const auto found = std::ranges::find(records_, std::optional(name), &Record::name);
-        return found != records_.end()
-                   ? std::optional(static_cast<uint32>(found - records_.begin()))
-                   : std::nullopt;
+        const auto found = ids_by_name_.lower_bound({name, 0});
+        return found != ids_by_name_.end() && found->first == name ? std::optional(found->second)
+                                                                   : std::nullopt;
     }
 
     std::optional<uint32> find_in_order(const std::string &name)
@@ -141,32 +145,87 @@ class AllocatorModel
         uint64 freed_at = 0;
     };
 
+    void rename(uint32 id, const std::optional<std::string> &name)
+    {
+        std::optional<std::string> &old = records_[id].name;
+        if (old) {
+            ids_by_name_.erase({*old, id});
+        }
+        old = name;
+        if (name) {
+            ids_by_name_.emplace(*name, id);
+        }
+    }
+
     std::vector<Record> records_;
+    std::set<std::pair<std::string, uint32>> ids_by_name_;
     std::list<uint32> free_;
     std::vector<uint32> order_;
     std::size_t start_ = 0;
 };
 
-const std::vector<std::string> &names()
+// Some that are special, and so many of tunnels.
+std::vector<std::string> make_names(unsigned num_tunnels)
 {
-    static const std::vector<std::string> all = [] {
-        std::vector<std::string> made = {"",
-                                         "default",
-                                         "defaults",
-                                         "\xff\x80",
-                                         std::string(64, 'x'),
-                                         std::string(65, 'x'),
-                                         std::string(300, 'x'),
-                                         std::string(299, 'x') + 'y'};
-        for (int i = 0; i < 60; ++i) {
-            made.push_back("tunnel" + std::to_string(i));
-        }
-        return made;
-    }();
-    return all;
+    std::vector<std::string> made = {"",
+                                     "default",
+                                     "defaults",
+                                     "\xff\x80",
+                                     std::string(64, 'x'),
+                                     std::string(65, 'x'),
+                                     std::string(300, 'x'),
+                                     std::string(299, 'x') + 'y'};
+    for (unsigned i = 0; i < num_tunnels; ++i) {
+        made.push_back("tunnel" + std::to_string(i));
+    }
+    return made;
 }
 
-class TunnelIdModel : public LibraryTest, public testing::WithParamInterface<uint32>
+// How long the allocator works, and on what.
+struct Course {
+    uint32 bound;
+    unsigned num_tunnels = 60;
+    unsigned steps = 20000;
+    unsigned steps_of_an_era = 1000; // then it begins anew
+    unsigned steps_between_comparisons = 20;
+    std::vector<unsigned> bindings_of_9_in_turn = {6}; // the others are releases
+    // What takes long where there are many tunnels is done one of so many times.
+    unsigned times_of_a_long_step = 1;
+};
+
+void PrintTo(const Course &course, std::ostream *out)
+{
+    *out << course.bound;
+}
+
+// How often nearly all IDs were in use, and then few of them.
+class Tide
+{
+  public:
+    explicit Tide(uint32 bound) : bound_(bound) {}
+
+    void see(uint32 num_used)
+    {
+        most_ = std::max(most_, num_used);
+        if (num_used > bound_ / 10 * 9) {
+            is_full_ = true;
+        } else if (is_full_ && num_used < bound_ / 3) {
+            is_full_ = false;
+            ++times_emptied_;
+        }
+    }
+
+    uint32 most() const { return most_; }
+    std::size_t times_emptied() const { return times_emptied_; }
+
+  private:
+    uint32 bound_;
+    uint32 most_ = 0;
+    bool is_full_ = false;
+    std::size_t times_emptied_ = 0;
+};
+
+class TunnelIdModel : public LibraryTest, public testing::WithParamInterface<Course>
 {
   protected:
     TunnelIdModel() { host_.set_log_level(2); }
@@ -180,37 +239,27 @@ class TunnelIdModel : public LibraryTest, public testing::WithParamInterface<uin
     // Restarts the allocator, and the time with it.
     void begin()
     {
-        begin_tunnel_ids(GetParam());
-        model_ = AllocatorModel(GetParam());
+        begin_tunnel_ids(GetParam().bound);
+        model_ = AllocatorModel(GetParam().bound);
         now_ = below(2) * 1000;
         tell_time();
     }
 
-    void step()
+    void step(unsigned bindings_of_9)
     {
-        switch (below(16)) {
-        case 0:
-        case 1:
-        case 2:
+        constexpr unsigned first_binding = 3;
+        const unsigned chosen = below(16);
+        if (chosen < first_binding) {
             return advance();
-        case 3:
-        case 4:
-        case 5:
-        case 6:
-        case 7:
-        case 8:
-            return bind();
-        case 9:
-        case 10:
-        case 11:
-            return release();
-        case 12:
-            return ask_for_some();
-        case 13:
-        case 14:
+        }
+        if (chosen < first_binding + 9) {
+            return chosen < first_binding + bindings_of_9 ? bind() : release();
+        }
+        if (chosen == 13 || chosen == 14) {
             return look_up();
-        default:
-            return look_up_in_order();
+        }
+        if (below(GetParam().times_of_a_long_step) == 0) {
+            return chosen == 12 ? ask_for_some() : look_up_in_order();
         }
     }
 
@@ -218,7 +267,7 @@ class TunnelIdModel : public LibraryTest, public testing::WithParamInterface<uin
     {
         ASSERT_EQ(in_library(md_get_total_tunnels), static_cast<int>(model_.num_in_order()));
         ASSERT_EQ(names_in_order(), model_.names_in_order());
-        for (const std::string &name : names()) {
+        for (const std::string &name : names_) {
             ASSERT_EQ(id_of(name), found(model_.find(name), "77")) << name;
         }
         // With this number the sum is 0, and all that can be offered is.
@@ -226,7 +275,9 @@ class TunnelIdModel : public LibraryTest, public testing::WithParamInterface<uin
         ASSERT_EQ(offer(all), model_.offer(all, now_));
     }
 
-    const std::string &any_name() { return names()[below(names().size())]; }
+    const std::string &any_name() { return names_[below(names_.size())]; }
+
+    uint32 num_in_order() const { return model_.num_in_order(); }
 
   private:
     static std::string found(const std::optional<uint32> &id, const std::string &without)
@@ -307,28 +358,55 @@ class TunnelIdModel : public LibraryTest, public testing::WithParamInterface<uin
     uint32 below(std::size_t end) { return static_cast<uint32>(random_() % end); }
 
     std::mt19937 random_{20240609};
+    std::vector<std::string> names_ = make_names(GetParam().num_tunnels);
     AllocatorModel model_{0};
     uint64 now_ = 0;
 };
 
 TEST_P(TunnelIdModel, AgreesWithTheAllocator)
 {
-    constexpr unsigned steps = 20000;
-    constexpr unsigned steps_of_an_era = 1000;
-    constexpr unsigned steps_between_comparisons = 20;
-    for (unsigned n = 0; n < steps; ++n) {
-        if (n % steps_of_an_era == 0) {
+    const Course &course = GetParam();
+    const std::size_t num_turns = course.bindings_of_9_in_turn.size();
+    Tide tide(course.bound);
+    for (unsigned n = 0; n < course.steps; ++n) {
+        if (n % course.steps_of_an_era == 0) {
             begin();
         }
-        ASSERT_NO_FATAL_FAILURE(step()) << "step " << n;
-        if (n % steps_between_comparisons == 0) {
+        const std::size_t turn = n * num_turns / course.steps;
+        ASSERT_NO_FATAL_FAILURE(step(course.bindings_of_9_in_turn[turn])) << "step " << n;
+        if ((n + 1) % course.steps_between_comparisons == 0) {
             ASSERT_NO_FATAL_FAILURE(compare_all()) << "after step " << n;
         }
+        tide.see(num_in_order());
         forget_calls();
+    }
+    // The steps have met what they are about.
+    EXPECT_GT(tide.most(), course.bound / 2);
+    if (num_turns > 1) {
+        EXPECT_EQ(tide.times_emptied(), num_turns / 2);
     }
 }
 
-INSTANTIATE_TEST_SUITE_P(Bounds, TunnelIdModel, testing::Values(19U, 20U, 21U, 30U, 60U, 200U),
+// With the last one the IDs run out and come back twice, and it never begins anew.
+constexpr unsigned steps_without_end = sanitized ? 30000 : 100000;
+
+const Course courses[] = {
+    {.bound = 19},
+    {.bound = 20},
+    {.bound = 21},
+    {.bound = 30},
+    {.bound = 60},
+    {.bound = 200},
+    {.bound = 1000,
+     .num_tunnels = 1200,
+     .steps = steps_without_end,
+     .steps_of_an_era = steps_without_end,
+     .steps_between_comparisons = steps_without_end / 12,
+     .bindings_of_9_in_turn = {7, 1, 7, 1},
+     .times_of_a_long_step = 64},
+};
+
+INSTANTIATE_TEST_SUITE_P(Bounds, TunnelIdModel, testing::ValuesIn(courses),
                          testing::PrintToStringParamName());
 
 } // namespace

@@ -3,6 +3,7 @@
 #include "tests/library/library_test.h"
 #include "tests/library/literal_table.h"
 #include "tests/library/tunnel_cache.h"
+#include "tests/support/sanitized.h"
 
 #include <algorithm>
 #include <ostream>
@@ -172,6 +173,20 @@ uint32 random_id(std::size_t text, Random &random)
     }
 }
 
+// Adds a text, as often as so many of 8 times, or removes it.
+void change(Twins &twins, const std::vector<std::string> &texts, unsigned adds_of_8, Random &random)
+{
+    const std::size_t i = random.below(texts.size());
+    if (random.below(8) < adds_of_8) {
+        twins.add(texts[i], random_id(i, random));
+    } else {
+        twins.del(texts[i]);
+    }
+}
+
+// A table grows, stays, shrinks and stays.
+constexpr unsigned adds_of_8_in_turn[] = {7, 4, 2, 4};
+
 class TextTableModel : public LibraryTest,
                        public testing::WithParamInterface<std::tuple<TableOperations, Sequence>>
 {
@@ -187,22 +202,16 @@ class TextTableModel : public LibraryTest,
 TEST_P(TextTableModel, EverySlotIsAsTheLiteralTableHasIt)
 {
     constexpr unsigned steps_between_comparisons = 2000;
-    constexpr unsigned adds_of_8_in_turn[] = {7, 4, 2, 4};
     const std::vector<std::string> texts = make_texts(sequence().texts, random_);
     Twins twins(table(), sequence().seed_ending);
     uint32 most = 0;
     for (unsigned step = 0; step < sequence().steps; ++step) {
-        // The table grows, stays, shrinks and stays, twice.
+        // All turns twice, the second time from the beginning.
         const unsigned adds = adds_of_8_in_turn[step * 8 / sequence().steps % 4];
         if (step == sequence().steps / 2) {
             twins.begin_anew();
         }
-        const std::size_t i = random_.below(texts.size());
-        if (random_.below(8) < adds) {
-            twins.add(texts[i], random_id(i, random_));
-        } else {
-            twins.del(texts[i]);
-        }
+        change(twins, texts, adds, random_);
         ASSERT_NO_FATAL_FAILURE(twins.compare_find(texts[random_.below(texts.size())]));
         if ((step + 1) % steps_between_comparisons == 0) {
             ASSERT_NO_FATAL_FAILURE(twins.compare_all_slots()) << "after step " << step;
@@ -223,6 +232,37 @@ INSTANTIATE_TEST_SUITE_P(Both, TextTableModel,
                          testing::Combine(testing::ValuesIn(table_operations),
                                           testing::ValuesIn(sequences)),
                          name_of_sequence);
+
+// One table is enough: both are of one making.
+class TableOfNames : public LibraryTest
+{
+  protected:
+    TableOfNames() { host_.set_log_level(2); }
+
+    Random random_{20240610};
+};
+
+TEST_F(TableOfNames, IsAsTheLiteralOneAfterAMillionSteps)
+{
+    constexpr unsigned steps = sanitized ? 100000 : 1000000;
+    // No multiples of each other: the table is looked at in all its turns.
+    constexpr unsigned steps_between_comparisons = steps / 8;
+    constexpr unsigned steps_of_a_turn = steps / 42;
+    const std::vector<std::string> texts = make_texts({200, 1, 9, false}, random_);
+    Twins twins(table_operations[0], 0xffc0);
+    uint32 most = 0;
+    for (unsigned step = 0; step < steps; ++step) {
+        change(twins, texts, adds_of_8_in_turn[step / steps_of_a_turn % 4], random_);
+        if (step % 8 == 0) {
+            ASSERT_NO_FATAL_FAILURE(twins.compare_find(texts[random_.below(texts.size())]));
+        }
+        if ((step + 1) % steps_between_comparisons == 0) {
+            ASSERT_NO_FATAL_FAILURE(twins.compare_all_slots()) << "after step " << step;
+            most = std::max(most, twins.num_live());
+        }
+    }
+    EXPECT_GT(most, texts.size() / 2);
+}
 
 class TextTableAsAWhole : public LibraryTest, public testing::WithParamInterface<TableOperations>
 {
