@@ -210,6 +210,39 @@ FaultRow row_of_first_acl()
              {fails(Operation::mdb_set_node_binding), {"{code}", up_to(lines, 5, {bail})}}})};
 }
 
+// What becomes of another ACL of an entry: `all` has both references of the entry.
+std::vector<FailureRow> another_acl_failures(const Lines &lines, const std::string &as_before,
+                                             const std::string &all, const Outcome &no_new_acl,
+                                             const Outcome &no_old_acl, const Outcome &no_list)
+{
+    const ExpectedLine bail = unit.bail(references_function);
+    const ExpectedLine null = unit.unexpected_null(references_function);
+    return {
+        {fails(Operation::bn_binding_name_parts_pattern_match), {"0" + as_before}},
+        {fails(Operation::bn_attrib_array_get_attrib_tstr),
+         {"{code}" + as_before, up_to(lines, 1, {bail})}},
+        {hands_out_nothing(Operation::bn_attrib_array_get_attrib_tstr), no_new_acl},
+        {fails(Operation::smprintf, 1), {"14001" + as_before, up_to(lines, 1, {null})}},
+        {fails(Operation::mdb_get_node_binding), {"{code}" + as_before, up_to(lines, 2, {bail})}},
+        {hands_out_nothing(Operation::mdb_get_node_binding), no_old_acl},
+        {fails(Operation::bn_binding_get_str), {"{code}" + as_before, up_to(lines, 2, {bail})}},
+        {hands_out_nothing(Operation::bn_binding_get_str), no_old_acl},
+        {fails(Operation::smprintf, 2), {"14001" + as_before, up_to(lines, 3, {null})}},
+        {fails(Operation::bn_binding_new_str), {"{code}" + as_before, up_to(lines, 5, {bail})}},
+        {hands_out_nothing(Operation::bn_binding_new_str),
+         {"14001" + as_before, up_to(lines, 5, {null})}},
+        {fails(Operation::mdb_set_node_binding, 1),
+         {"{code}" + as_before, up_to(lines, 5, {bail})}},
+        {fails(Operation::smprintf, 3), {"14001" + all, up_to(lines, 5, {null})}},
+        {fails(Operation::mdb_get_tstr_array), {"{code}" + all, up_to(lines, 6, {bail})}},
+        {hands_out_nothing(Operation::mdb_get_tstr_array), no_list},
+        {fails(Operation::smprintf, 4), {"14001" + all, up_to(lines, 6, {null})}},
+        {fails(Operation::bn_binding_new_named), {"{code}" + all, up_to(lines, 8, {bail})}},
+        {hands_out_nothing(Operation::bn_binding_new_named),
+         {"14001" + all, up_to(lines, 8, {null})}},
+        {fails(Operation::mdb_set_node_binding, 2), {"{code}" + all, up_to(lines, 8, {bail})}}};
+}
+
 // The new reference stays whatever becomes of the old one.
 template <const MapKind &kind>
 FaultRow row_of_another_acl(const std::string &situation)
@@ -226,8 +259,6 @@ FaultRow row_of_another_acl(const std::string &situation)
         path_line(references_function, "/ov/tunneld/acl/config/a1/" + key + "/m1"),
         gated(6, "Removing /ov/tunneld/acl/config/a1/" + key + "/m1"),
     };
-    const ExpectedLine bail = unit.bail(references_function);
-    const ExpectedLine null = unit.unexpected_null(references_function);
     const Outcome success = {"0" + reference(kind, "a2", "10"), lines};
     const std::string as_before = reference(kind, "a1", "10");
     const std::string both = as_before + reference(kind, "a2", "10");
@@ -239,45 +270,17 @@ FaultRow row_of_another_acl(const std::string &situation)
                                 {modify_line, acl_path,
                                  gated(6, "refcheck: acl=a2, m1-10, old=(null)"), lines[3],
                                  lines[4]}};
-    return {
-        references_function,
-        situation,
-        as_it_is,
-        [](HostFixture &) {
-            MapCommit commit;
-            give_acl(commit, kind);
-            return acl_set(kind, commit, "a2");
-        },
-        success,
-        with_trace_failures(
+    return {references_function,
+            situation,
+            as_it_is,
+            [](HostFixture &) {
+                MapCommit commit;
+                give_acl(commit, kind);
+                return acl_set(kind, commit, "a2");
+            },
             success,
-            {{fails(Operation::bn_binding_name_parts_pattern_match), {"0" + as_before}},
-             {fails(Operation::bn_attrib_array_get_attrib_tstr),
-              {"{code}" + as_before, up_to(lines, 1, {bail})}},
-             {hands_out_nothing(Operation::bn_attrib_array_get_attrib_tstr), no_new_acl},
-             {fails(Operation::smprintf, 1), {"14001" + as_before, up_to(lines, 1, {null})}},
-             {fails(Operation::mdb_get_node_binding),
-              {"{code}" + as_before, up_to(lines, 2, {bail})}},
-             {hands_out_nothing(Operation::mdb_get_node_binding), no_old_acl},
-             {fails(Operation::bn_binding_get_str),
-              {"{code}" + as_before, up_to(lines, 2, {bail})}},
-             {hands_out_nothing(Operation::bn_binding_get_str), no_old_acl},
-             {fails(Operation::smprintf, 2), {"14001" + as_before, up_to(lines, 3, {null})}},
-             {fails(Operation::bn_binding_new_str),
-              {"{code}" + as_before, up_to(lines, 5, {bail})}},
-             {hands_out_nothing(Operation::bn_binding_new_str),
-              {"14001" + as_before, up_to(lines, 5, {null})}},
-             {fails(Operation::mdb_set_node_binding, 1),
-              {"{code}" + as_before, up_to(lines, 5, {bail})}},
-             {fails(Operation::smprintf, 3), {"14001" + both, up_to(lines, 5, {null})}},
-             {fails(Operation::mdb_get_tstr_array), {"{code}" + both, up_to(lines, 6, {bail})}},
-             {hands_out_nothing(Operation::mdb_get_tstr_array), success},
-             {fails(Operation::smprintf, 4), {"14001" + both, up_to(lines, 6, {null})}},
-             {fails(Operation::bn_binding_new_named), {"{code}" + both, up_to(lines, 8, {bail})}},
-             {hands_out_nothing(Operation::bn_binding_new_named),
-              {"14001" + both, up_to(lines, 8, {null})}},
-             {fails(Operation::mdb_set_node_binding, 2),
-              {"{code}" + both, up_to(lines, 8, {bail})}}})};
+            with_trace_failures(success, another_acl_failures(lines, as_before, both, no_new_acl,
+                                                              no_old_acl, success))};
 }
 
 // A removed entry, or one that has lost its ACL: the lines differ in how they begin. Entry 20 names
@@ -375,8 +378,6 @@ FaultRow row_of_removed_entry()
 // Entry 20 keeps its reference, and the map's level with it.
 FaultRow row_of_another_acl_of_one_entry()
 {
-    const ExpectedLine bail = unit.bail(references_function);
-    const ExpectedLine null = unit.unexpected_null(references_function);
     const Lines begin = {
         modify_line,
         acl_path_line,
@@ -402,45 +403,17 @@ FaultRow row_of_another_acl_of_one_entry()
         up_to(lines, 6,
               {path_line(references_function, "/ov/tunneld/acl/config/a1/rmap/m1"),
                gated(6, "Removing /ov/tunneld/acl/config/a1/rmap/m1")})};
-    return {
-        references_function,
-        "of_another_acl_of_one_of_two_entries",
-        as_it_is,
-        [](HostFixture &) {
-            MapCommit commit;
-            give_acl_twice(commit);
-            return acl_set(route_map, commit, "a2");
-        },
-        success,
-        with_trace_failures(
+    return {references_function,
+            "of_another_acl_of_one_of_two_entries",
+            as_it_is,
+            [](HostFixture &) {
+                MapCommit commit;
+                give_acl_twice(commit);
+                return acl_set(route_map, commit, "a2");
+            },
             success,
-            {{fails(Operation::bn_binding_name_parts_pattern_match), {"0" + as_before}},
-             {fails(Operation::bn_attrib_array_get_attrib_tstr),
-              {"{code}" + as_before, up_to(lines, 1, {bail})}},
-             {hands_out_nothing(Operation::bn_attrib_array_get_attrib_tstr), no_new_acl},
-             {fails(Operation::smprintf, 1), {"14001" + as_before, up_to(lines, 1, {null})}},
-             {fails(Operation::mdb_get_node_binding),
-              {"{code}" + as_before, up_to(lines, 2, {bail})}},
-             {hands_out_nothing(Operation::mdb_get_node_binding), no_old_acl},
-             {fails(Operation::bn_binding_get_str),
-              {"{code}" + as_before, up_to(lines, 2, {bail})}},
-             {hands_out_nothing(Operation::bn_binding_get_str), no_old_acl},
-             {fails(Operation::smprintf, 2), {"14001" + as_before, up_to(lines, 3, {null})}},
-             {fails(Operation::bn_binding_new_str),
-              {"{code}" + as_before, up_to(lines, 5, {bail})}},
-             {hands_out_nothing(Operation::bn_binding_new_str),
-              {"14001" + as_before, up_to(lines, 5, {null})}},
-             {fails(Operation::mdb_set_node_binding, 1),
-              {"{code}" + as_before, up_to(lines, 5, {bail})}},
-             {fails(Operation::smprintf, 3), {"14001" + all, up_to(lines, 5, {null})}},
-             {fails(Operation::mdb_get_tstr_array), {"{code}" + all, up_to(lines, 6, {bail})}},
-             {hands_out_nothing(Operation::mdb_get_tstr_array), no_list},
-             {fails(Operation::smprintf, 4), {"14001" + all, up_to(lines, 6, {null})}},
-             {fails(Operation::bn_binding_new_named), {"{code}" + all, up_to(lines, 8, {bail})}},
-             {hands_out_nothing(Operation::bn_binding_new_named),
-              {"14001" + all, up_to(lines, 8, {null})}},
-             {fails(Operation::mdb_set_node_binding, 2),
-              {"{code}" + all, up_to(lines, 8, {bail})}}})};
+            with_trace_failures(success, another_acl_failures(lines, as_before, all, no_new_acl,
+                                                              no_old_acl, no_list))};
 }
 
 // Whatever refers to the default entry stays.
