@@ -12,7 +12,7 @@ namespace ovhost
 /// process and for those it starts. They are made when they are missing, with
 /// DIR/var/opt/tms/output; DIR itself must be there. Where the machine has no /opt/orvale or no
 /// /var/opt/tms, its /opt or /var/opt keeps its entries but cannot be written.
-//
+///
 /// The process must have one thread. It needs no privilege where user namespaces are allowed, and
 /// ends with the capabilities it had. Throws std::runtime_error, which says what failed and what
 /// to do; the process should then end, since it may be in half a namespace.

@@ -5,9 +5,8 @@
 //   /net/interface/config/NAME/enable                       bool
 //   /net/interface/config/NAME/addr/ipv4/static/N/ip        ipv4addr
 //   /net/interface/config/NAME/addr/ipv4/static/N/mask_len  uint8     0 to 32
-//   /ov/tunneld/net/interface/tunnel/vlan/config/NAME       string    NAME again: a VLAN interface
+//   /ov/tunneld/net/interface/tunnel/vlan/config/NAME       string    NAME again: a VLAN
 //   /ov/tunneld/net/interface/tunnel/ip/config/NAME         string    NAME again: a tunnel
-//   interface
 //
 // A VLAN or tunnel interface needs a record of its own only for what stands below one. The modules
 // are net_interfaces.h, interface_addresses.h and interface_budget.h.

@@ -3,13 +3,14 @@
 // match, and what they say in the words of match strings. legacy_faults.h judges them,
 // legacy_upgrade.h has them converted.
 //
-// Fields, below an entry's match node, and the keys that they have in a match string:
+// Fields, below an entry's match node, and what they become in its match string:
 //
-//   application src/port dest/port vlan protocol dscp  application src_port dst_port and as they
-//   are ipver                                              the family of the addresses, ipv4 or
-//   ipv6 source/addr/...                                    src_ip; written whenever there is a
-//   family dest/addr/...                                      dst_ip, as src_ip acl none: the entry
-//   stays as it is
+//   application               application
+//   src/port, dest/port       src_port, dst_port
+//   vlan, protocol, dscp      keys of the same names
+//   ipver                     tells which of its addresses an entry matches by, ipv4 or ipv6
+//   source/addr/FAMILY/...    src_ip, there whenever ipver has a family; dest/addr: dst_ip
+//   acl                       nothing: the entry stays as it is
 
 #include "framework/mdb_db.h"
 #include "host/modules/map_kinds.h"
