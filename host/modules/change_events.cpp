@@ -1,5 +1,6 @@
 #include "host/modules/change_events.h"
 
+#include "host/modules/commit_access.h"
 #include "host/modules/node_access.h"
 #include "orvale/md_event_common.h"
 
@@ -34,10 +35,8 @@ void announce(const mdb_db_change &change)
 
 void ChangeEventsModule::notify(const mdb_db_change_array *changes)
 {
-    const auto count = static_cast<uint32>(mdb_db_change_array_length_quick(changes));
-    for (uint32 i = 0; i < count; ++i) {
-        const mdb_db_change *const change = mdb_db_change_array_get_quick(changes, i);
-        if (change != nullptr && !change->mdc_no_notify) {
+    for (const mdb_db_change *const change : changes_in(changes)) {
+        if (!change->mdc_no_notify) {
             announce(*change);
         }
     }

@@ -24,6 +24,18 @@ std::vector<std::string> name_parts(const mdb_db_change *change)
     return texts_of(change->mdc_name_parts);
 }
 
+std::vector<const mdb_db_change *> changes_in(const mdb_db_change_array *changes)
+{
+    std::vector<const mdb_db_change *> list;
+    const auto count = static_cast<uint32>(mdb_db_change_array_length_quick(changes));
+    for (uint32 i = 0; i < count; ++i) {
+        if (const mdb_db_change *const change = mdb_db_change_array_get_quick(changes, i)) {
+            list.push_back(change);
+        }
+    }
+    return list;
+}
+
 bool matches(const mdb_db_change *change, const std::string &pattern)
 {
     return bn_binding_name_parts_pattern_match(change->mdc_name_parts, true, pattern.c_str());

@@ -14,6 +14,9 @@ namespace ovhost
 /// The components of the changed node's name, escapes resolved.
 [[nodiscard]] std::vector<std::string> name_parts(const mdb_db_change *change);
 
+/// The changes of a commit, without what a list may hold in place of one.
+[[nodiscard]] std::vector<const mdb_db_change *> changes_in(const mdb_db_change_array *changes);
+
 [[nodiscard]] bool matches(const mdb_db_change *change, const std::string &pattern);
 
 [[nodiscard]] bool is_deleted(const mdb_db_change *change);

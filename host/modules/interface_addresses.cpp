@@ -40,11 +40,8 @@ std::optional<Subnet> read_address(const mdb_db *db, const std::string &node)
 std::set<std::string> touched_addresses(const mdb_db_change_array *changes)
 {
     std::set<std::string> nodes;
-    const int32 count = mdb_db_change_array_length_quick(changes);
-    for (int32 i = 0; i < count; ++i) {
-        const mdb_db_change *const change =
-            mdb_db_change_array_get_quick(changes, static_cast<uint32>(i));
-        if (change != nullptr && (matches(change, ip_pattern) || matches(change, mask_pattern))) {
+    for (const mdb_db_change *const change : changes_in(changes)) {
+        if (matches(change, ip_pattern) || matches(change, mask_pattern)) {
             nodes.insert(address_node(ts_str(change->mdc_name)));
         }
     }

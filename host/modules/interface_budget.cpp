@@ -27,15 +27,11 @@ struct Tally {
 Tally count_interfaces(const mdb_db_change_array *changes)
 {
     Tally tally;
-    const int32 count = mdb_db_change_array_length_quick(changes);
-    for (int32 i = 0; i < count; ++i) {
-        const mdb_db_change *const change =
-            mdb_db_change_array_get_quick(changes, static_cast<uint32>(i));
-        if (change == nullptr || !matches(change, counted_pattern)) {
-            continue;
+    for (const mdb_db_change *const change : changes_in(changes)) {
+        if (matches(change, counted_pattern)) {
+            tally.added += change->mdc_change_type == mdct_add;
+            tally.removed += is_deleted(change);
         }
-        tally.added += change->mdc_change_type == mdct_add;
-        tally.removed += is_deleted(change);
     }
     return tally;
 }

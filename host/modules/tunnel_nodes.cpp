@@ -51,10 +51,8 @@ std::optional<Tunnel> read_tunnel(const mdb_db *db, const std::string &name)
 std::set<std::string> touched_tunnels(const mdb_db_change_array *changes)
 {
     std::set<std::string> names;
-    const auto count = static_cast<uint32>(mdb_db_change_array_length_quick(changes));
-    for (uint32 i = 0; i < count; ++i) {
-        const mdb_db_change *const change = mdb_db_change_array_get_quick(changes, i);
-        if (change != nullptr && is_about_a_tunnel(*change)) {
+    for (const mdb_db_change *const change : changes_in(changes)) {
+        if (is_about_a_tunnel(*change)) {
             names.emplace(tstr_array_get_str_quick(change->mdc_name_parts, tunnel_name_part));
         }
     }
