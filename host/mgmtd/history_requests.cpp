@@ -218,6 +218,15 @@ json answer_past_diff(const Configuration &configuration, const json &request)
     return {{"changes", changes_json(diff(configuration.after(from), configuration.after(to)))}};
 }
 
+json answer_commit(Configuration &configuration, const json &request, const ClientInfo &client)
+{
+    const CommitNote note = client_note(request, client);
+    const std::optional<Wait> waited = configuration.store().wait();
+    const CommitReport report = configuration.commit(note);
+    throw_unless_accepted(report, "the commit is refused");
+    return commit_answer(configuration, report, waited);
+}
+
 json answer_rollback(Configuration &configuration, const json &request, const ClientInfo &client)
 {
     const std::uint64_t number = known_commit(configuration, required_number(request, "number"));

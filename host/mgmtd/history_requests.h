@@ -24,6 +24,8 @@ struct ClientInfo;
                                                 const nlohmann::json &request);
 [[nodiscard]] nlohmann::json answer_past_diff(const Configuration &configuration,
                                               const nlohmann::json &request);
+[[nodiscard]] nlohmann::json answer_commit(Configuration &configuration,
+                                           const nlohmann::json &request, const ClientInfo &client);
 [[nodiscard]] nlohmann::json answer_rollback(Configuration &configuration,
                                              const nlohmann::json &request,
                                              const ClientInfo &client);

@@ -177,15 +177,17 @@ json Requests::check(const json &, const ClientInfo &)
     return {{"changes", report.changes.size()}, {"warnings", warnings_json(report.warnings)}};
 }
 
+json Requests::store(Storing carry_out, const json &request, const ClientInfo &client)
+{
+    daemon_.before_events();
+    json answer = carry_out(configuration_, request, client);
+    daemon_.after_commit();
+    return answer;
+}
+
 json Requests::commit(const json &request, const ClientInfo &client)
 {
-    const CommitNote note = client_note(request, client);
-    const std::optional<Wait> waited = configuration_.store().wait();
-    daemon_.before_events();
-    const CommitReport report = configuration_.commit(note);
-    daemon_.after_commit();
-    throw_unless_accepted(report, "the commit is refused");
-    return commit_answer(configuration_, report, waited);
+    return store(answer_commit, request, client);
 }
 
 json Requests::history(const json &request, const ClientInfo &)
@@ -195,10 +197,7 @@ json Requests::history(const json &request, const ClientInfo &)
 
 json Requests::rollback(const json &request, const ClientInfo &client)
 {
-    daemon_.before_events();
-    json answer = answer_rollback(configuration_, request, client);
-    daemon_.after_commit();
-    return answer;
+    return store(answer_rollback, request, client);
 }
 
 json Requests::confirm(const json &, const ClientInfo &)
@@ -225,10 +224,7 @@ json Requests::alarm(const json &request, const ClientInfo &)
 
 json Requests::upgrade(const json &request, const ClientInfo &client)
 {
-    daemon_.before_events();
-    json answer = answer_upgrade(configuration_, request, client);
-    daemon_.after_commit();
-    return answer;
+    return store(answer_upgrade, request, client);
 }
 
 json Requests::status(const json &, const ClientInfo &)

@@ -22,7 +22,7 @@ struct DaemonView {
     std::function<std::vector<PeerStatus>()> peers;
     /// Called before anything that may send events.
     std::function<void()> before_events;
-    /// Called when a commit may have been stored, or one need not wait for its confirmation any
+    /// Called when a commit has been stored, or one need not wait for its confirmation any
     /// more: the time of undoing may be another, and those who watch have to be told.
     std::function<void()> after_commit = [] {};
 };
@@ -38,6 +38,12 @@ class Requests : public RequestHandler
   private:
     struct Command;
     static const Command commands[];
+
+    /// Carries out what may store a commit, and throws when nothing was stored.
+    using Storing = nlohmann::json (*)(Configuration &configuration, const nlohmann::json &request,
+                                       const ClientInfo &client);
+    nlohmann::json store(Storing carry_out, const nlohmann::json &request,
+                         const ClientInfo &client);
 
     nlohmann::json get(const nlohmann::json &request, const ClientInfo &client);
     nlohmann::json set(const nlohmann::json &request, const ClientInfo &client);
