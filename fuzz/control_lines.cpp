@@ -102,12 +102,6 @@ void answer(std::string_view line)
 
 } // namespace
 
-int LLVMFuzzerInitialize(int *, char ***)
-{
-    silence_log();
-    return 0;
-}
-
 int LLVMFuzzerTestOneInput(const std::uint8_t *data, std::size_t size)
 {
     FuzzedDataProvider input(data, size);

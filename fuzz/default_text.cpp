@@ -76,15 +76,9 @@ std::string to_line(const Entry &entry)
 
 } // namespace
 
-int LLVMFuzzerInitialize(int *, char ***)
-{
-    silence_log();
-    enter_scratch_root();
-    return 0;
-}
-
 int LLVMFuzzerTestOneInput(const std::uint8_t *data, std::size_t size)
 {
+    static const ScratchRoot files;
     const Entries first = read({reinterpret_cast<const char *>(data), size});
     std::string text;
     for (const Entry &entry : first.values) {

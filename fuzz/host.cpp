@@ -18,13 +18,7 @@ void report_broken(const char *promise)
     std::abort();
 }
 
-void silence_log()
-{
-    G_log_level = ov_log_debug;
-    ovhost::set_log_sink([](const ovhost::LogRecord &) {});
-}
-
-void enter_scratch_root()
+ScratchRoot::ScratchRoot()
 {
     std::string path = (std::filesystem::temp_directory_path() / "ovfuzz.XXXXXX").string();
     require(::mkdtemp(path.data()) != nullptr, "a temporary folder can be made");
@@ -49,3 +43,10 @@ const std::string *text_of(const mdb_db &db, const std::string &node)
 }
 
 } // namespace ovfuzz
+
+int LLVMFuzzerInitialize(int *, char ***)
+{
+    G_log_level = ov_log_debug;
+    ovhost::set_log_sink([](const ovhost::LogRecord &) {});
+    return 0;
+}

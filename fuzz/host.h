@@ -20,12 +20,11 @@ inline void require(bool holds, const char *promise)
     }
 }
 
-/// From here on every line is printed and then dropped, so that formats are tried too.
-void silence_log();
-
-/// Gives the process fixed directories of its own, under the directory for temporary files, where
-/// they stay when it ends. To be called before the first run.
-void enter_scratch_root();
+/// From the first of its objects on, the process has fixed directories of its own, under the
+/// directory for temporary files, where they stay when it ends.
+struct ScratchRoot {
+    ScratchRoot();
+};
 
 /// A commit that counts refusals.
 struct Commit : md_commit {
@@ -42,6 +41,7 @@ const std::string *text_of(const mdb_db &db, const std::string &node);
 
 } // namespace ovfuzz
 
-/// The engine's entry points: it declares them nowhere.
+/// The engine's entry points, which it declares nowhere. The first is the same for all fuzzers:
+/// every line of the log is printed and then dropped, so that formats are tried too.
 extern "C" int LLVMFuzzerInitialize(int *argc, char ***argv);
 extern "C" int LLVMFuzzerTestOneInput(const std::uint8_t *data, std::size_t size);

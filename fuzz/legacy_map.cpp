@@ -75,12 +75,6 @@ void check_converted(const mdb_db &olddb, const mdb_db &newdb, const std::string
 
 } // namespace
 
-int LLVMFuzzerInitialize(int *, char ***)
-{
-    silence_log();
-    return 0;
-}
-
 int LLVMFuzzerTestOneInput(const std::uint8_t *data, std::size_t size)
 {
     FuzzedDataProvider input(data, size);

@@ -61,12 +61,6 @@ void append(const std::string &begun, std::size_t size, const std::string &key,
 
 } // namespace
 
-int LLVMFuzzerInitialize(int *, char ***)
-{
-    silence_log();
-    return 0;
-}
-
 int LLVMFuzzerTestOneInput(const std::uint8_t *data, std::size_t size)
 {
     // From its end the engine's reader takes numbers, from its beginning texts.

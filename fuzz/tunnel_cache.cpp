@@ -93,12 +93,6 @@ void step(Model &model, FuzzedDataProvider &input)
 
 } // namespace
 
-int LLVMFuzzerInitialize(int *, char ***)
-{
-    silence_log();
-    return 0;
-}
-
 int LLVMFuzzerTestOneInput(const std::uint8_t *data, std::size_t size)
 {
     FuzzedDataProvider input(data, size);
