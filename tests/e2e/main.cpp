@@ -1,23 +1,11 @@
 // The main program of these tests: the daemons that they start see a network of their own.
 #include "tests/support/namespaces.h"
-
-#include <gmock/gmock.h>
-#include <gtest/gtest.h>
-
-#include <exception>
-#include <iostream>
+#include "tests/support/run_tests.h"
 
 int main(int argc, char **argv)
 {
-    testing::InitGoogleMock(&argc, argv);
-    if (testing::GTEST_FLAG(list_tests)) {
-        return RUN_ALL_TESTS();
-    }
-    try {
+    return ovtest::run_tests(argc, argv, [] {
         ovtest::enter_private_network();
-        return RUN_ALL_TESTS();
-    } catch (const std::exception &error) {
-        std::cerr << error.what() << '\n';
-        return 1;
-    }
+        return true;
+    });
 }

@@ -2,27 +2,17 @@
 // network interfaces are the program's own before the first test runs.
 #include "host/mgmtd/private_root.h"
 #include "tests/support/namespaces.h"
+#include "tests/support/run_tests.h"
 #include "tests/support/scratch_dir.h"
 
-#include <gmock/gmock.h>
-#include <gtest/gtest.h>
-
-#include <exception>
-#include <iostream>
+#include <memory>
 
 int main(int argc, char **argv)
 {
-    testing::InitGoogleMock(&argc, argv);
-    if (testing::GTEST_FLAG(list_tests)) {
-        return RUN_ALL_TESTS();
-    }
-    try {
+    return ovtest::run_tests(argc, argv, [] {
         ovtest::enter_private_network();
-        const ovtest::ScratchDir root;
-        ovhost::enter_private_root(root.path());
-        return RUN_ALL_TESTS();
-    } catch (const std::exception &error) {
-        std::cerr << error.what() << '\n';
-        return 1;
-    }
+        auto root = std::make_unique<const ovtest::ScratchDir>();
+        ovhost::enter_private_root(root->path());
+        return root;
+    });
 }
